@@ -1,0 +1,41 @@
+# Set-up, build and test on a fresh Debian machine: `make test`, `make demo`.
+BUILD      ?= build
+ASAN_BUILD ?= build/asan
+JOBS       ?= 2
+DEB_PACKAGES = cmake g++ clang lld make libgtest-dev libgmock-dev libbenchmark-dev \
+               libpugixml-dev libxlsxwriter-dev libncurses-dev locales \
+               python3-ezdxf python3-openpyxl libdxflib-dev
+
+.PHONY: deps build test bench clean
+
+# Installs what is missing when run as root; otherwise only says what is missing.
+deps:
+	@missing=""; for p in $(DEB_PACKAGES); do \
+	  dpkg-query -W -f='$${Status}' $$p 2>/dev/null | grep -q "install ok installed" || missing="$$missing $$p"; \
+	done; \
+	if [ -n "$$missing" ]; then \
+	  if [ "$$(id -u)" = 0 ]; then \
+	    echo "Installation de :$$missing"; \
+	    apt-get update -qq && DEBIAN_FRONTEND=noninteractive apt-get install -y -qq $$missing; \
+	  else echo "Paquets manquants (à installer en root) :$$missing"; fi; \
+	fi
+	@if [ "$$(id -u)" = 0 ] && ! locale -a 2>/dev/null | grep -qi '^fr_FR.utf-\?8$$'; then \
+	  sed -i 's/^# *fr_FR.UTF-8 UTF-8/fr_FR.UTF-8 UTF-8/' /etc/locale.gen && locale-gen >/dev/null; \
+	fi
+
+build: deps
+	cmake -S . -B $(BUILD) -DCMAKE_BUILD_TYPE=RelWithDebInfo
+	cmake --build $(BUILD) -j$(JOBS)
+
+test: deps
+	cmake -S . -B $(ASAN_BUILD) -DCMAKE_BUILD_TYPE=Debug -DVEL_SANITIZE=ON
+	cmake --build $(ASAN_BUILD) -j$(JOBS)
+	cd $(ASAN_BUILD) && ctest --output-on-failure -j$(JOBS)
+
+bench: deps
+	cmake -S . -B build/bench -DCMAKE_BUILD_TYPE=Release -DVEL_BENCH=ON
+	cmake --build build/bench -j$(JOBS)
+	@for b in build/bench/bin/bench_*; do [ -x "$$b" ] && "$$b"; done
+
+clean:
+	rm -rf $(BUILD)

@@ -140,6 +140,79 @@ std::string FormatString(const char* format, ...)
     return out;
 }
 
+std::string FormatPattern(std::string_view pattern, const std::vector<PatternArg>& args)
+{
+    std::string out;
+    out.reserve(pattern.size() + 16);
+    std::size_t next = 0;
+    std::size_t i = 0;
+    while (i < pattern.size()) {
+        const char c = pattern[i];
+        if (c != '%') {
+            out += c;
+            ++i;
+            continue;
+        }
+        if (i + 1 < pattern.size() && pattern[i + 1] == '%') {
+            out += '%';
+            i += 2;
+            continue;
+        }
+        // %[flags][width][.precision]conversion, with small bounded numbers only.
+        std::size_t j = i + 1;
+        while (j < pattern.size() && std::string_view("-+ #0").find(pattern[j]) != std::string_view::npos)
+            ++j;
+        std::size_t digits = 0;
+        while (j < pattern.size() && pattern[j] >= '0' && pattern[j] <= '9' && digits < 3) {
+            ++j;
+            ++digits;
+        }
+        if (j < pattern.size() && pattern[j] == '.') {
+            ++j;
+            digits = 0;
+            while (j < pattern.size() && pattern[j] >= '0' && pattern[j] <= '9' && digits < 2) {
+                ++j;
+                ++digits;
+            }
+        }
+        const char conv = j < pattern.size() ? pattern[j] : '\0';
+        if (std::string_view("sdifgex").find(conv) == std::string_view::npos || conv == '\0') {
+            out += c; // not a conversion we fill: keep the text as written
+            ++i;
+            continue;
+        }
+        const std::string spec(pattern.substr(i, j - i + 1));
+        const PatternArg* arg = next < args.size() ? &args[next] : nullptr;
+        ++next;
+        if (conv == 's') {
+            std::string text;
+            if (arg != nullptr)
+                text = arg->kind == PatternArg::Kind::Text ? arg->text
+                     : arg->kind == PatternArg::Kind::Real ? FormatRealShortest(arg->real)
+                                                           : std::to_string(arg->integer);
+            out += FormatString(spec.c_str(), text.c_str());
+        } else if (conv == 'd' || conv == 'i' || conv == 'x') {
+            long long v = 0;
+            if (arg != nullptr)
+                v = arg->kind == PatternArg::Kind::Int ? arg->integer
+                  : arg->kind == PatternArg::Kind::Real ? static_cast<long long>(arg->real)
+                                                        : ParseInt(arg->text).value_or(0);
+            std::string llspec = spec;
+            llspec.insert(llspec.size() - 1, "ll");
+            out += FormatString(llspec.c_str(), v);
+        } else {
+            double v = 0;
+            if (arg != nullptr)
+                v = arg->kind == PatternArg::Kind::Real ? arg->real
+                  : arg->kind == PatternArg::Kind::Int ? static_cast<double>(arg->integer)
+                                                       : ParseReal(arg->text).value_or(0.0);
+            out += FormatString(spec.c_str(), v);
+        }
+        i = j + 1;
+    }
+    return out;
+}
+
 std::string FormatInt(int value)
 {
     return FormatString("%d", value);

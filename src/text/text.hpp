@@ -15,6 +15,28 @@
 std::string FormatString(const char* format, ...) __attribute__((format(printf, 1, 2)));
 std::string FormatStringV(const char* format, va_list args);
 
+// One value for a placeholder of a stored pattern (a catalogue text, a code pattern).
+struct PatternArg {
+    enum class Kind { Text, Real, Int };
+    PatternArg(const char* t) : kind(Kind::Text), text(t ? t : "") {}
+    PatternArg(std::string t) : kind(Kind::Text), text(std::move(t)) {}
+    PatternArg(std::string_view t) : kind(Kind::Text), text(t) {}
+    PatternArg(double r) : kind(Kind::Real), real(r) {}
+    PatternArg(int i) : kind(Kind::Int), integer(i) {}
+    Kind kind;
+    std::string text;
+    double real = 0;
+    long long integer = 0;
+};
+
+// Fills the printf placeholders of a pattern that is data, not code: each conversion
+// (%s, %d, %i, %f, %g, %e, %x with flags, width and precision) takes the next argument,
+// converted to the placeholder's type; "%%" is a percent sign. A placeholder with no
+// argument left takes the empty text or zero, and anything that is not a plain
+// conversion (%n, %p, "*" widths...) is copied as it stands, so no pattern can read
+// memory it was not given.
+std::string FormatPattern(std::string_view pattern, const std::vector<PatternArg>& args);
+
 // "%d".
 std::string FormatInt(int value);
 

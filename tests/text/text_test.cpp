@@ -120,3 +120,29 @@ TEST(JoinStrings, Separators)
 }
 
 } // namespace
+
+namespace {
+
+TEST(FormatPattern, FillsOnlyWhatItIsGiven)
+{
+    struct Case { const char* pattern; std::vector<PatternArg> args; const char* expected; };
+    const Case cases[] = {
+        {"RSX_VOL_%.2f_%.2f", {1.3, 2.0}, "RSX_VOL_1.30_2.00"},
+        {"Longueur 2D %.2f m <= H <= %.2f m", {1.3}, "Longueur 2D 1.30 m <= H <= 0.00 m"},
+        {"RSX_TUY_LIN_3D_%s", {"PVC 200 %n %s"}, "RSX_TUY_LIN_3D_PVC 200 %n %s"},
+        {"%s\\\\Canalisation EP", {"EU \"1\""}, "EU \"1\"\\\\Canalisation EP"},
+        {"Fourreau (peigne)", {"ignored"}, "Fourreau (peigne)"},
+        {"%s-%03d", {"GC", 7}, "GC-007"},
+        {"100%% %n %p %*d %", {}, "100% %n %p %*d %"},
+        {"%.3f m", {std::string("0.125")}, "0.125 m"},
+        {"%d", {2.9}, "2"},
+        {"%s", {0.1}, "0.1"},
+        {"%s et %s", {}, " et "},
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.pattern);
+        EXPECT_EQ(FormatPattern(c.pattern, c.args), c.expected);
+    }
+}
+
+} // namespace

@@ -260,7 +260,9 @@ bool CZodEVIBdr::AddEditedArticle(const CZodEVIArticle& article)
         return false;
     CZodEVIArticle model;
     std::set<std::string> visited;
-    if (!FindModel(*category, model, visited))
+    // The copy is already in the schedule; an unknown key of its own must not make it
+    // its own model, or it would keep that key and hide a real neighbour.
+    if (!FindModel(*category, model, visited, copy))
         return false;
     copy->groupKey = model.groupKey;
     if (CZodEVIGroup* group = groups.Find(copy->groupKey))
@@ -268,7 +270,8 @@ bool CZodEVIBdr::AddEditedArticle(const CZodEVIArticle& article)
     return true;
 }
 
-bool CZodEVIBdr::FindModel(const std::string& category, CZodEVIArticle& model, std::set<std::string>& visited) const
+bool CZodEVIBdr::FindModel(const std::string& category, CZodEVIArticle& model, std::set<std::string>& visited,
+                           const CZodEVIArticle* exclude) const
 {
     if (!visited.insert(category).second)
         return false;
@@ -276,7 +279,7 @@ bool CZodEVIBdr::FindModel(const std::string& category, CZodEVIArticle& model, s
     CZodEVIArticleList inCategory;
     ArticlesInCategory(category, inCategory);
     for (const CZodEVIArticle* candidate : inCategory) {
-        if (!candidate->groupKey.empty() && IsAssociatedKey(candidate->groupKey)) {
+        if (candidate != exclude && !candidate->groupKey.empty() && IsAssociatedKey(candidate->groupKey)) {
             model = *candidate;
             return true;
         }
@@ -285,7 +288,7 @@ bool CZodEVIBdr::FindModel(const std::string& category, CZodEVIArticle& model, s
     std::vector<std::string> subCategories;
     SubCategories(category, subCategories);
     for (const std::string& sub : subCategories)
-        if (FindModel(sub, model, visited))
+        if (FindModel(sub, model, visited, exclude))
             return true;
 
     const auto last = category.rfind('\\');
@@ -294,7 +297,7 @@ bool CZodEVIBdr::FindModel(const std::string& category, CZodEVIArticle& model, s
         std::vector<std::string> siblings;
         SubCategories(parent, siblings);
         for (const std::string& sibling : siblings)
-            if (FindModel(sibling, model, visited))
+            if (FindModel(sibling, model, visited, exclude))
                 return true;
     }
     return false;

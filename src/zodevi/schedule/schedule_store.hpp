@@ -87,7 +87,10 @@ public:
     // Keeps a copy of an article the user added in the editor and gives it the group of
     // a neighbouring associated article; true when its group key changed.
     bool AddEditedArticle(const CZodEVIArticle& article);
-    bool FindModel(const std::string& category, CZodEVIArticle& model, std::set<std::string>& visited) const;
+    // Searches the category, its subcategories and its parent's for an associated
+    // article; `exclude` (the article being placed) is never its own model.
+    bool FindModel(const std::string& category, CZodEVIArticle& model, std::set<std::string>& visited,
+                   const CZodEVIArticle* exclude = nullptr) const;
 
     // The network index a network update was given for a network group.
     void SetNetworkIndex(const std::string& groupKey, int networkIndex);

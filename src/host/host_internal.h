@@ -1,0 +1,30 @@
+// Links between the pieces of the host library that modules never see: which module
+// is running, and the clean-up after a module has gone.
+#pragma once
+
+#include <string>
+
+// The module whose code runs (its appId), null for the host itself.
+void* velCurrentApp();
+
+// Marks a module as running for the scope (commands, entry point calls).
+class VelAppScope {
+ public:
+  explicit VelAppScope(void* appId);
+  ~VelAppScope();
+  VelAppScope(const VelAppScope&) = delete;
+  VelAppScope& operator=(const VelAppScope&) = delete;
+};
+
+// True while the module is loaded (its code may be called).
+bool velIsLoadedApp(void* appId);
+
+// Path of a loaded module, "" for null or unknown.
+std::string velAppPath(void* appId);
+
+// Converts "\" to "/" so that names written for Windows find Linux files.
+std::string velNativePath(const std::string& name);
+
+// Replaces a file once its new content is completely on disk, keeping its mode; false
+// with errno set, the old file untouched, on failure.
+bool velReplaceFile(const std::string& fileName, const std::string& content);

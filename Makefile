@@ -4,7 +4,7 @@ ASAN_BUILD ?= build/asan
 JOBS       ?= 2
 DEB_PACKAGES = cmake g++ clang lld make libgtest-dev libgmock-dev libbenchmark-dev \
                libpugixml-dev libxlsxwriter-dev libncurses-dev locales \
-               python3-ezdxf python3-openpyxl libdxflib-dev
+               python3-ezdxf python3-openpyxl libdxflib-dev libedit-dev
 
 .PHONY: deps build test bench clean
 

@@ -3,78 +3,14 @@
 // keys, group keys and codes.
 #pragma once
 
+#include "zodevi/article.h"
+
 #include <array>
 #include <optional>
 #include <string>
 #include <string_view>
 
 class CZodEVIArtParam;
-
-// One priced line of the schedule. The field order is the record's exchange order with
-// the metre module; the metreXxx fields belong to that module and are only carried.
-class CZodEVIArticle {
-public:
-    std::string code;
-    double unitPrice = 0;
-    double metreReal1 = 0;
-    double taxRate = 19.6;
-    double metreReal2 = 1.0;
-    std::string metreText1;
-    int number = -1;
-    int metreInt1 = 0;
-    std::string metreText2;
-    int nature = 2;
-    std::string designation;
-    std::string metreText3;
-    std::string unit;
-    std::string quantityKey;
-    std::string description;
-    int metreInt2 = 0;
-    int metreInt3 = 0;
-    std::string metreText4;
-    int metreInt4 = 0;
-    std::string groupKey;
-    int metreInt5 = 0;
-    int metreInt6 = 7;
-    int metreInt7 = 0;
-    std::string metreText5;
-    int metreInt8 = 0;
-    double metreReal3 = 0;
-    double metreReal4 = 0;
-    int metreInt9 = 0;
-    std::string metreText6;
-    int metreInt10 = 0;
-    std::string metreText7;
-    int metreInt11 = 7;
-    std::string metreText8;
-    std::string metreText9;
-    double metreReal5 = 0;
-    int metreInt12 = 7;
-    std::string metreText10;
-    std::string metreText11;
-    double metreReal6 = 1.0;
-    double metreReal7 = 0;
-    double metreReal8 = 1.0;
-    int metreInt13 = 0;
-    std::string metreText12;
-    int metreInt14 = 0;
-    double metreReal9 = 1.0;
-    double metreReal10 = 1.0;
-    double metreReal11 = 0;
-    std::string treePath;
-};
-
-// Describes one field of the record by name, so that readers and writers walk all 48
-// fields in their order without naming each one.
-struct CZodEVIArticleField {
-    enum class Type { Text, Real, Int };
-    const char* name;
-    Type type;
-    std::string CZodEVIArticle::*text;
-    double CZodEVIArticle::*real;
-    int CZodEVIArticle::*integer;
-};
-const std::array<CZodEVIArticleField, 48>& ArticleFields();
 
 // Article natures.
 enum : int {

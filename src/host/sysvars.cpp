@@ -246,9 +246,12 @@ int acedSetVar(const char* name, const resbuf* value) {
 void velRbClear(resbuf* rb) {
   if (rb == nullptr) return;
   if (velRbKind(rb->restype) == VelRbKind::String && rb->resval.rstring != nullptr) {
-    resbuf* tmp = velRbString(RTSTR, "");
-    std::swap(tmp->resval.rstring, rb->resval.rstring);
-    acutRelRb(tmp);
+    // Freed the way the result-buffer functions free their own texts.
+    resbuf* holder = acutNewRb(RTNONE);
+    holder->restype = RTSTR;
+    holder->resval.rstring = rb->resval.rstring;
+    rb->resval.rstring = nullptr;
+    acutRelRb(holder);
   }
   rb->restype = RTNONE;
 }

@@ -1,0 +1,105 @@
+// Finding the sibling modules: a service already registered is used as it is; otherwise
+// the module file is searched on the host's support path, loaded, and checked.
+#include "module/siblings.hpp"
+
+#include "text/text.hpp"
+#include "velhost/editor.h"
+
+namespace {
+
+// "x.arx" and "A.ARX" already carry the extension; ".arx" alone does not.
+bool HasArxExtension(const std::string& name)
+{
+    if (CharCount(name) <= 4)
+        return false;
+    return EqualsNoCase(name.substr(name.size() - 4), ".arx");
+}
+
+AcRxDictionary* ServiceDictionary()
+{
+    return static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"));
+}
+
+} // namespace
+
+void* GetServiceSymbol(const char* moduleFile, const char* serviceName, const char* symbolName)
+{
+    if (symbolName == nullptr || *symbolName == '\0' || serviceName == nullptr || *serviceName == '\0')
+        return nullptr;
+    if (!acrxServiceIsRegistered(serviceName)) {
+        if (moduleFile == nullptr || *moduleFile == '\0')
+            return nullptr;
+        const char* extension = HasArxExtension(moduleFile) ? "" : ".arx";
+        const std::string candidates[] = {
+            FormatString("%s%s", moduleFile, extension),
+            FormatString("..\\Programmes\\%s%s", moduleFile, extension),
+            FormatString("Programmes\\%s%s", moduleFile, extension),
+        };
+        for (const std::string& candidate : candidates) {
+            std::string found;
+            if (acedFindFile(candidate.c_str(), found) == RTNORM) {
+                acrxLoadModule(found.c_str(), true, true);
+                break;
+            }
+        }
+    }
+    return acrxGetServiceSymbolAddr(serviceName, symbolName);
+}
+
+AcRxObject* GetServiceObject(const char* moduleFile, const char* serviceName)
+{
+    const std::string file = moduleFile ? moduleFile : "";
+    const std::string service = serviceName ? serviceName : "";
+    if (!acrxServiceIsRegistered(service.c_str())) {
+        const std::string candidates[] = {file, "..\\Programmes\\" + file, "Programmes\\" + file};
+        std::string found;
+        bool located = false;
+        for (const std::string& candidate : candidates) {
+            if (acedFindFile(candidate.c_str(), found) == RTNORM) {
+                located = true;
+                break;
+            }
+        }
+        if (!located)
+            acrx_abort("Impossible de trouver le module <%s>!!!", file.c_str());
+        if (!acrxDynamicLinker()->loadModule(found.c_str(), true, true))
+            acrx_abort("Impossible de charger le module <%s>!!!", found.c_str());
+        if (!acrxServiceIsRegistered(service.c_str()))
+            acrx_abort("Pas de service <%s>\nenregistré par le module <%s>!!!", service.c_str(), found.c_str());
+    }
+    return ServiceDictionary()->at(service.c_str());
+}
+
+CVelMainServices* MainServices()
+{
+    return static_cast<CVelMainServices*>(GetServiceObject(kMainModule, kMainService));
+}
+
+CVelConfigServices* ConfigServices()
+{
+    return static_cast<CVelConfigServices*>(GetServiceObject(kConfigModule, kConfigService));
+}
+
+namespace sibling {
+
+std::int32_t Rsx_WriteXDataMetres()
+{
+    return CallNetwork<Rsx_WriteXDataMetresFn>("Rsx_WriteXDataMetres");
+}
+
+std::int32_t Rsx_GetRsxFromType(std::string* networkName, std::vector<std::string>* projects)
+{
+    return CallNetwork<Rsx_GetRsxFromTypeFn>("Rsx_GetRsxFromType", networkName, projects);
+}
+
+std::int32_t VtMetre_ListeDesMetres(std::vector<std::string>* names, std::int32_t* out)
+{
+    return CallMetre<VtMetre_ListeDesMetresFn>("VtMetre_ListeDesMetres", names, out);
+}
+
+std::int32_t VtMetre_SymbMonetaire(std::string* symbol)
+{
+    return CallMetre<VtMetre_SymbMonetaireFn>("VtMetre_SymbMonetaire", symbol);
+}
+
+} // namespace sibling

@@ -1,0 +1,100 @@
+// The four sibling modules: where they are, how their services and exported functions
+// are reached (loading a module on demand), the service objects' operations, and the
+// forwarders to the metre and network sizing functions.
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "velhost/rx.h"
+
+// Module files and service names of the siblings.
+inline constexpr const char* kMetreModule = "VelMetre15.arx";
+inline constexpr const char* kMetreService = "VelantoMetreServices r17.2";
+inline constexpr const char* kNetworkModule = "VelReseDimVRD15.arx";
+inline constexpr const char* kNetworkService = "VelantoReseDimServices r17.2";
+inline constexpr const char* kMainModule = "Vel2000Srv.arx";
+inline constexpr const char* kMainService = "VelantoMainServices r17.2";
+inline constexpr const char* kConfigModule = "VelSrvConfig15.arx";
+inline constexpr const char* kConfigService = "VelantoConfigServices r17.2";
+
+// Address of the function the service exports under symbolName, loading the module file
+// first when the service is not registered; null when anything is missing. Silent.
+void* GetServiceSymbol(const char* moduleFile, const char* serviceName, const char* symbolName);
+
+// The object registered under serviceName, loading the module file first when needed.
+// Never answers null: a module that cannot be found, loaded or that registers no such
+// service ends the host (acrx_abort).
+AcRxObject* GetServiceObject(const char* moduleFile, const char* serviceName);
+
+// Operations of the main services module's service object, in the order of its table.
+class CVelMainServices : public AcRxService {
+public:
+    virtual void ShowInfo(const std::string& text) = 0;
+    // A folder to which a file name is appended directly.
+    virtual std::string GetDataFolder(int folderCode) = 0;
+    virtual std::string GetParameterFile() = 0;
+    virtual void RegisterModule(const std::string& moduleName) = 0;
+    virtual void UnregisterModule(const std::string& moduleName) = 0;
+    // Owner of the module's modal dialogs; null for none.
+    virtual void* GetParentWindow() = 0;
+    virtual bool UnloadQuery() = 0;
+    // Full path of a data file, "" when not found.
+    virtual std::string FindDataFile(const std::string& fileName, int locationCode) = 0;
+    virtual void ShowCommandList(const std::string& title, const std::string& moduleName, int first,
+                                 int count, const std::vector<std::string>& lines) = 0;
+    // Text of a message number; it stays the main services module's.
+    virtual const char* GetMessageText(int number) = 0;
+};
+
+// Operations of the configuration services module's service object.
+class CVelConfigServices : public AcRxService {
+public:
+    virtual void RegisterConfigPage(const std::string& section, const std::string& createFunction,
+                                    const std::string& moduleName, const std::string& pageTitle) = 0;
+};
+
+// The two service objects (the host ends when a module is missing).
+CVelMainServices* MainServices();
+CVelConfigServices* ConfigServices();
+
+// Signatures of the sibling functions called with simple arguments.
+using Rsx_WriteXDataMetresFn = std::int32_t();
+using Rsx_GetRsxFromTypeFn = std::int32_t(std::string* networkName, std::vector<std::string>* projects);
+using VtMetre_ListeDesMetresFn = std::int32_t(std::vector<std::string>* names, std::int32_t* out);
+using VtMetre_SymbMonetaireFn = std::int32_t(std::string* symbol);
+
+// Calls the function a sibling exports under symbol, as a function of type Fn; answers
+// 1 without calling when the function cannot be found, else the function's answer.
+template <class Fn, class... Args>
+std::int32_t CallSiblingFunction(const char* moduleFile, const char* serviceName, const char* symbol,
+                                 Args&&... args)
+{
+    void* address = GetServiceSymbol(moduleFile, serviceName, symbol);
+    if (address == nullptr)
+        return 1;
+    return reinterpret_cast<Fn*>(address)(std::forward<Args>(args)...);
+}
+
+template <class Fn, class... Args>
+std::int32_t CallMetre(const char* symbol, Args&&... args)
+{
+    return CallSiblingFunction<Fn>(kMetreModule, kMetreService, symbol, std::forward<Args>(args)...);
+}
+
+template <class Fn, class... Args>
+std::int32_t CallNetwork(const char* symbol, Args&&... args)
+{
+    return CallSiblingFunction<Fn>(kNetworkModule, kNetworkService, symbol, std::forward<Args>(args)...);
+}
+
+// Forwarders of the functions above (1 when missing). In a namespace of their own, so
+// that a sibling may include this header and define the exported functions themselves.
+namespace sibling {
+std::int32_t Rsx_WriteXDataMetres();
+std::int32_t Rsx_GetRsxFromType(std::string* networkName, std::vector<std::string>* projects);
+std::int32_t VtMetre_ListeDesMetres(std::vector<std::string>* names, std::int32_t* out);
+std::int32_t VtMetre_SymbMonetaire(std::string* symbol);
+} // namespace sibling

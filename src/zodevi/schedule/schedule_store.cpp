@@ -246,6 +246,16 @@ bool CZodEVIBdr::RemoveByTreePath(const std::string& treePath)
     return true;
 }
 
+std::size_t CZodEVIBdr::RemoveArticles(const std::vector<const CZodEVIArticle*>& victims)
+{
+    const std::unordered_set<const CZodEVIArticle*> doomed(victims.begin(), victims.end());
+    if (doomed.empty())
+        return 0;
+    for (const auto& entry : groups)
+        std::erase_if(*entry.second, [&](const CZodEVIArticle* a) { return doomed.count(a) != 0; });
+    return std::erase_if(articles, [&](const std::unique_ptr<CZodEVIArticle>& a) { return doomed.count(a.get()) != 0; });
+}
+
 bool CZodEVIBdr::AddEditedArticle(const CZodEVIArticle& article)
 {
     CZodEVIArticle* copy = AddArticle(std::make_unique<CZodEVIArticle>(article));

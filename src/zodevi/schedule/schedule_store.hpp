@@ -84,6 +84,11 @@ public:
     // The group of a key; with create, an empty one is made when missing.
     CZodEVIGroup* GroupOf(const std::string& groupKey, bool create);
     bool RemoveByTreePath(const std::string& treePath);
+    // Removes these articles from every group that lists them and from the schedule,
+    // and destroys them; pointers that are not in the schedule are ignored. Answers how
+    // many articles went. Removing by identity, not by tree path, is what lets a purge
+    // take exactly its own articles when two of them look alike.
+    std::size_t RemoveArticles(const std::vector<const CZodEVIArticle*>& victims);
     // Keeps a copy of an article the user added in the editor and gives it the group of
     // a neighbouring associated article; true when its group key changed.
     bool AddEditedArticle(const CZodEVIArticle& article);

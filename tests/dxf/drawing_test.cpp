@@ -1,0 +1,288 @@
+// Tests of whole drawings: the fixtures written by ezdxf, byte-for-byte rewriting, what
+// changes when the host writes, and the refusal of malformed files.
+#include "host/dxf/drawing.hpp"
+
+#include <gtest/gtest.h>
+
+#include <fstream>
+#include <sstream>
+
+#include "velhost/dbase.h"
+
+namespace {
+
+std::string Slurp(const std::string& path)
+{
+    std::ifstream in(path, std::ios::binary);
+    std::stringstream ss;
+    ss << in.rdbuf();
+    return ss.str();
+}
+
+std::string Fixture(const char* name)
+{
+    return std::string(VEL_TEST_DATA) + "/dxf/" + name;
+}
+
+std::unique_ptr<AcDbDatabase> Open(const std::string& path)
+{
+    std::unique_ptr<AcDbDatabase> db;
+    std::string error;
+    EXPECT_TRUE(velOpenDrawing(path, db, error)) << error;
+    return db;
+}
+
+std::string Written(AcDbDatabase& db)
+{
+    std::string out;
+    std::string error;
+    EXPECT_TRUE(velWriteDrawing(db, out, error)) << error;
+    return out;
+}
+
+TEST(Drawing, FixturesReadAndWriteBackByteForByte)
+{
+    const struct {
+        const char* file;
+        const char* version;
+        int osmode;
+        const char* clayer;
+        std::size_t layers;
+    } cases[] = {
+        {"r12.dxf", "AC1009", 33, "0", 3},
+        {"r2000.dxf", "AC1015", 37, "RESEAU_EP", 3},
+        {"r2004_1252.dxf", "AC1018", 37, "0", 4},
+        {"r2018.dxf", "AC1032", 37, "0", 3},
+        {"crlf.dxf", "AC1032", 37, "0", 3},
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.file);
+        auto db = Open(Fixture(c.file));
+        ASSERT_TRUE(db);
+        EXPECT_EQ(db->dxfVersion(), c.version);
+        EXPECT_EQ(db->osmode(), c.osmode);
+        EXPECT_EQ(db->layerName(db->clayer()), c.clayer);
+        EXPECT_EQ(db->layerNames().size(), c.layers);
+        EXPECT_FALSE(db->isModified());
+        EXPECT_EQ(Written(*db), Slurp(Fixture(c.file)));
+    }
+}
+
+TEST(Drawing, HeaderSettingsOfAnOlderFile)
+{
+    auto db = Open(Fixture("r2000.dxf"));
+    EXPECT_EQ(db->aunits(), 1);
+    EXPECT_EQ(db->angbase(), 90.0);
+    EXPECT_TRUE(db->angdir());
+    EXPECT_EQ(db->cecolor().colorIndex(), 3);
+    EXPECT_FALSE(db->limcheck());
+}
+
+TEST(Drawing, OmittedHeaderVariablesTakeDefaultsAndAreAddedOnceSet)
+{
+    auto db = Open(Fixture("r2018.dxf"));
+    EXPECT_EQ(db->osmode(), kVelDefaultOsmode);
+    EXPECT_EQ(db->attdia(), kVelDefaultAttdia);
+    EXPECT_EQ(db->attreq(), kVelDefaultAttreq);
+    EXPECT_TRUE(db->limcheck());
+    EXPECT_TRUE(db->orthomode());
+    ASSERT_EQ(db->setOsmode(512), Acad::eOk);
+    ASSERT_EQ(db->setLimcheck(false), Acad::eOk);
+    EXPECT_TRUE(db->isModified());
+    std::unique_ptr<AcDbDatabase> back;
+    std::string error;
+    ASSERT_TRUE(velReadDrawing(Written(*db), "copie.dxf", back, error)) << error;
+    EXPECT_EQ(back->osmode(), 512);
+    EXPECT_FALSE(back->limcheck());
+    EXPECT_TRUE(back->orthomode());
+}
+
+TEST(Drawing, NewObjectsGetHandlesBelowTheSeedAndTheirApplicationIsRegistered)
+{
+    for (const char* file : {"r2000.dxf", "r2018.dxf", "crlf.dxf"}) {
+        SCOPED_TRACE(file);
+        auto db = Open(Fixture(file));
+        AcDbDictionary* nod = nullptr;
+        ASSERT_EQ(db->getNamedObjectsDictionary(nod, AcDb::kForWrite), Acad::eOk);
+        auto* record = new AcDbXrecord;
+        AcDbObjectId id;
+        ASSERT_EQ(nod->setAt("NOUVEAU", record, id), Acad::eOk);
+        VelRbBuilder list;
+        list.add(velRbString(1001, "NOUVELLE_APP")).add(velRbShort(1070, 3));
+        ASSERT_EQ(record->setXData(list.head()), Acad::eOk);
+        record->close();
+        nod->close();
+        EXPECT_TRUE(db->isRegApp("NOUVELLE_APP"));
+        const std::string text = Written(*db);
+        if (std::string(file) == "crlf.dxf") {
+            EXPECT_EQ(text.find("NOUVELLE_APP\n"), std::string::npos);
+            EXPECT_NE(text.find("NOUVELLE_APP\r\n"), std::string::npos);
+        }
+        std::unique_ptr<AcDbDatabase> back;
+        std::string error;
+        ASSERT_TRUE(velReadDrawing(text, file, back, error)) << error;
+        EXPECT_TRUE(back->isRegApp("NOUVELLE_APP"));
+        const auto& f = back->file();
+        std::uint64_t highest = 0;
+        for (const auto& r : f.records)
+            highest = std::max(highest, r.handle);
+        EXPECT_GT(f.handseed, highest);
+        AcDbDictionary* nod2 = nullptr;
+        ASSERT_EQ(back->getNamedObjectsDictionary(nod2, AcDb::kForRead), Acad::eOk);
+        AcDbObject* again = nullptr;
+        ASSERT_EQ(nod2->getAt("nouveau", again, AcDb::kForRead), Acad::eOk);
+        VelRbPtr xd(again->xData("NOUVELLE_APP"));
+        ASSERT_TRUE(xd && xd->rbnext);
+        EXPECT_EQ(xd->rbnext->resval.rint, 3);
+        again->close();
+        nod2->close();
+    }
+}
+
+TEST(Drawing, TextOfOlderFilesIsWrittenInTheirCodePage)
+{
+    auto db = Open(Fixture("r2004_1252.dxf"));
+    std::vector<std::string> names = db->layerNames();
+    EXPECT_NE(std::find(names.begin(), names.end(), "Réseau_Été"), names.end());
+    AcDbObjectId layer;
+    ASSERT_EQ(db->addLayer("Calque Ω é", layer), Acad::eOk);
+    ASSERT_EQ(db->setClayer(layer), Acad::eOk);
+    const std::string text = Written(*db);
+    EXPECT_NE(text.find("\n  8\nCalque \\U+03A9 \xE9\n"), std::string::npos);
+    std::unique_ptr<AcDbDatabase> back;
+    std::string error;
+    ASSERT_TRUE(velReadDrawing(text, "copie.dxf", back, error)) << error;
+    EXPECT_EQ(back->layerName(back->clayer()), "Calque Ω é");
+}
+
+TEST(Drawing, R12DrawingsHoldNoDictionaries)
+{
+    auto db = Open(Fixture("r12.dxf"));
+    AcDbDictionary* nod = nullptr;
+    EXPECT_EQ(db->getNamedObjectsDictionary(nod, AcDb::kForRead), Acad::eNotApplicable);
+    AcDbObjectId layer;
+    ASSERT_EQ(db->addLayer("NOUVEAU", layer), Acad::eOk);
+    ASSERT_EQ(db->addRegApp("APP_R12"), Acad::eOk);
+    std::unique_ptr<AcDbDatabase> back;
+    std::string error;
+    ASSERT_TRUE(velReadDrawing(Written(*db), "r12.dxf", back, error)) << error;
+    EXPECT_EQ(back->getLayerId("nouveau", layer), Acad::eOk);
+    EXPECT_TRUE(back->isRegApp("APP_R12"));
+}
+
+// A small sound drawing; the malformed cases below each spoil one thing in it.
+std::string Sound()
+{
+    return "  0\nSECTION\n  2\nHEADER\n  9\n$ACADVER\n  1\nAC1032\n  9\n$HANDSEED\n  5\nFF\n  0\nENDSEC\n"
+           "  0\nSECTION\n  2\nTABLES\n  0\nTABLE\n  2\nLAYER\n  5\n2\n 70\n1\n"
+           "  0\nLAYER\n  5\n10\n330\n2\n  2\n0\n 70\n0\n 62\n7\n  0\nENDTAB\n  0\nENDSEC\n"
+           "  0\nSECTION\n  2\nENTITIES\n"
+           "  0\nLINE\n  5\n20\n  8\n0\n 10\n0.0\n1001\nACAD\n1000\ntexte\n"
+           "  0\nENDSEC\n"
+           "  0\nSECTION\n  2\nOBJECTS\n"
+           "  0\nDICTIONARY\n  5\nC\n330\n0\n100\nAcDbDictionary\n  3\nA\n350\nD\n"
+           "  0\nDICTIONARY\n  5\nD\n330\nC\n100\nAcDbDictionary\n  3\nB\n360\nE\n"
+           "  0\nDICTIONARY\n  5\nE\n330\nD\n100\nAcDbDictionary\n"
+           "  0\nENDSEC\n  0\nEOF\n";
+}
+
+std::string Replace(std::string text, std::string_view what, std::string_view with)
+{
+    const auto at = text.find(what);
+    EXPECT_NE(at, std::string::npos) << what;
+    if (at != std::string::npos)
+        text.replace(at, what.size(), with);
+    return text;
+}
+
+std::uint32_t LineOf(const std::string& text, std::string_view marker)
+{
+    const auto at = text.find(marker);
+    return 1 + static_cast<std::uint32_t>(std::count(text.begin(), text.begin() + static_cast<std::ptrdiff_t>(at), '\n'));
+}
+
+TEST(Drawing, MalformedFilesAreRefusedWithFileLineAndExpectation)
+{
+    const std::string sound = Sound();
+    {
+        std::unique_ptr<AcDbDatabase> db;
+        std::string error;
+        ASSERT_TRUE(velReadDrawing(sound, "bon.dxf", db, error)) << error;
+    }
+    struct Case {
+        const char* name;
+        std::string text;
+        std::string marker;  // the line the message names starts with this (after the replacement)
+        int lineShift;
+        std::string expected;
+    };
+    const std::string truncated = sound.substr(0, sound.find("  0\nENDSEC\n  0\nEOF"));
+    const Case cases[] = {
+        {"truncated before the end", truncated, "", 0, "0 EOF en fin de fichier (fichier tronqué ?)"},
+        {"odd pair", truncated + "  0\n", "", 0, "une valeur après le code de groupe (fichier tronqué)"},
+        {"non-numeric group code", Replace(sound, "  8\n0\n 10", "  8\n0\n1O"), "1O", 0,
+         "un code de groupe (nombre entier)"},
+        {"dangling dictionary entry", Replace(sound, "350\nD\n", "350\n99\n"), "350\n99", 0,
+         "une entrée vers un objet du dessin (l'identifiant 99 de « A » n'existe pas)"},
+        {"cyclic dictionaries", Replace(sound, "100\nAcDbDictionary\n  0\nENDSEC",
+                                        "100\nAcDbDictionary\n  3\nX\n350\nC\n  0\nENDSEC"),
+         "350\nC\n  0\nENDSEC", 0,
+         "une entrée qui ne remonte pas à un dictionnaire parent (« X » ramène au dictionnaire de la ligne 65)"},
+        {"duplicate handle", Replace(sound, "  5\n20\n", "  5\n10\n"), "  0\nLINE", 0,
+         "un identifiant unique (10 est déjà celui de la ligne 27)"},
+        {"invalid UTF-8 text", Replace(sound, "texte", "t\xE9xte"), "t\xE9xte", 0, "un texte UTF-8 valide"},
+        {"malformed XData", Replace(sound, "1000\ntexte\n", "1070\ntexte\n"), "1070", 0, "un entier de 16 bits"},
+        {"entity outside a section", Replace(sound, "  0\nSECTION\n  2\nENTITIES\n", ""), "  0\nLINE", 0,
+         "0 SECTION"},
+        {"section without name", Replace(sound, "  2\nENTITIES\n", ""), "  0\nLINE", 0, "le nom de la section (code 2)"},
+        {"missing ENDSEC", Replace(sound, "  0\nENDSEC\n  0\nSECTION\n  2\nOBJECTS", "  0\nSECTION\n  2\nOBJECTS"),
+         "  0\nSECTION\n  2\nOBJECTS", 0, "0 ENDSEC avant la section suivante"},
+        {"header value that is no number", Replace(sound, "$HANDSEED\n  5\nFF", "$OSMODE\n 70\nbeaucoup"), "beaucoup",
+         0, "un entier pour $OSMODE"},
+        {"entry without table", Replace(sound, "  0\nTABLE\n  2\nLAYER\n  5\n2\n 70\n1\n", ""), "  0\nLAYER", 0,
+         "0 TABLE avant l'entrée de table"},
+        {"binary DXF", "AutoCAD Binary DXF\r\n\x1a", "", 0, "un DXF texte (le DXF binaire n'est pas pris en charge)"},
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.name);
+        std::unique_ptr<AcDbDatabase> db;
+        std::string error;
+        EXPECT_FALSE(velReadDrawing(c.text, "plan.dxf", db, error));
+        EXPECT_FALSE(db);
+        std::uint32_t line = c.marker.empty() ? 0 : LineOf(c.text, c.marker);
+        if (c.marker.empty())
+            line = static_cast<std::uint32_t>(std::count(c.text.begin(), c.text.end(), '\n')) + 1;
+        if (std::string(c.name) == "binary DXF")
+            line = 1;
+        EXPECT_EQ(error, "« plan.dxf », ligne " + std::to_string(line + c.lineShift) + " : il fallait " + c.expected);
+    }
+}
+
+TEST(Drawing, OpenAndSaveReportFileErrors)
+{
+    std::unique_ptr<AcDbDatabase> db;
+    std::string error;
+    EXPECT_FALSE(velOpenDrawing("/nonexistent/plan.dxf", db, error));
+    EXPECT_EQ(error.rfind("« /nonexistent/plan.dxf » : impossible d'ouvrir le fichier", 0), 0u) << error;
+    AcDbDatabase fresh;
+    EXPECT_FALSE(velSaveDrawing(fresh, "/nonexistent/plan.dxf", error));
+    EXPECT_EQ(error.rfind("« /nonexistent/plan.dxf » : enregistrement impossible", 0), 0u) << error;
+}
+
+TEST(Drawing, SaveReplacesTheFileOnlyWhenComplete)
+{
+    const std::string path = ::testing::TempDir() + "vel_save_test.dxf";
+    {
+        std::ofstream(path) << "ancien contenu";
+    }
+    AcDbDatabase db;
+    std::string error;
+    ASSERT_TRUE(velSaveDrawing(db, path, error)) << error;
+    EXPECT_EQ(db.fileName(), path);
+    std::unique_ptr<AcDbDatabase> back;
+    ASSERT_TRUE(velOpenDrawing(path, back, error)) << error;
+    EXPECT_EQ(back->dxfVersion(), "AC1032");
+    std::remove(path.c_str());
+}
+
+}  // namespace

@@ -45,8 +45,9 @@ std::string velSysVarText(const std::string& name);
 int velSetSysVarText(const std::string& name, const std::string& text, std::string& error);
 
 // Looks a file up: an absolute name as is, else in the modules folder, the current
-// drawing's folder, the profile folder, then the working folder. Backslashes count as
-// folder separators. RTNORM with the full path, or RTERROR.
+// drawing's folder, the profile folder, then the working folder; when no folder has the
+// exact name, names are matched without regard to case, as on Windows. Backslashes
+// count as folder separators. RTNORM with the full path, or RTERROR.
 int acedFindFile(const char* fileName, std::string& result);
 
 #pragma GCC visibility pop

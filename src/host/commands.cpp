@@ -66,7 +66,10 @@ Acad::ErrorStatus AcEdCommandStack::addCommand(const char* groupName, const char
   auto last = std::find_if(commands_.rbegin(), commands_.rend(), [&](const AcEdCommand& c) {
     return EqualsNoCase(c.groupName, groupName);
   });
-  commands_.insert(last.base(), std::move(cmd));
+  if (last == commands_.rend())
+    commands_.push_back(std::move(cmd));
+  else
+    commands_.insert(last.base(), std::move(cmd));
   return Acad::eOk;
 }
 

@@ -6,6 +6,7 @@
 #include <filesystem>
 
 #include "host_internal.h"
+#include "text/text.hpp"
 #include "velhost/documents.h"
 #include "velhost/editor.h"
 
@@ -29,6 +30,38 @@ std::string velDefaultProfileDir() {
   return (fs::current_path() / ".velhost").string();
 }
 
+namespace {
+
+// The file under folder whose path matches name without regard to case, level by level,
+// as names written for Windows expect; empty when there is none.
+fs::path MatchIgnoringCase(const fs::path& folder, const fs::path& name) {
+  std::error_code ec;
+  fs::path current = folder;
+  for (const fs::path& part : name) {
+    if (part == "." || part.empty()) continue;
+    if (part == "..") {
+      current = current.parent_path();
+      continue;
+    }
+    if (fs::exists(current / part, ec)) {
+      current /= part;
+      continue;
+    }
+    fs::path match;
+    for (fs::directory_iterator it(current, ec), end; !ec && it != end; it.increment(ec)) {
+      if (EqualsNoCase(it->path().filename().string(), part.string())) {
+        match = it->path();
+        break;
+      }
+    }
+    if (match.empty()) return {};
+    current = match;
+  }
+  return fs::is_regular_file(current, ec) ? current : fs::path();
+}
+
+}  // namespace
+
 int acedFindFile(const char* fileName, std::string& result) {
   if (fileName == nullptr || *fileName == '\0') return RTERROR;
   const fs::path name(velNativePath(fileName));
@@ -49,6 +82,13 @@ int acedFindFile(const char* fileName, std::string& result) {
     const fs::path candidate = (folder / name).lexically_normal();
     if (fs::is_regular_file(candidate, ec)) {
       result = fs::absolute(candidate, ec).string();
+      return RTNORM;
+    }
+  }
+  for (const fs::path& folder : folders) {
+    const fs::path match = MatchIgnoringCase(folder, name);
+    if (!match.empty()) {
+      result = fs::absolute(match, ec).lexically_normal().string();
       return RTNORM;
     }
   }

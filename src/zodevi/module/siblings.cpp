@@ -75,11 +75,6 @@ CVelMainServices* MainServices()
     return static_cast<CVelMainServices*>(GetServiceObject(kMainModule, kMainService));
 }
 
-CVelConfigServices* ConfigServices()
-{
-    return static_cast<CVelConfigServices*>(GetServiceObject(kConfigModule, kConfigService));
-}
-
 namespace sibling {
 
 std::int32_t Rsx_WriteXDataMetres()

@@ -9,6 +9,7 @@
 #include <vector>
 
 #include "velhost/rx.h"
+#include "velsiblings/main_services.h"
 
 // Module files and service names of the siblings.
 inline constexpr const char* kMetreModule = "VelMetre15.arx";
@@ -29,36 +30,8 @@ void* GetServiceSymbol(const char* moduleFile, const char* serviceName, const ch
 // service ends the host (acrx_abort).
 AcRxObject* GetServiceObject(const char* moduleFile, const char* serviceName);
 
-// Operations of the main services module's service object, in the order of its table.
-class CVelMainServices : public AcRxService {
-public:
-    virtual void ShowInfo(const std::string& text) = 0;
-    // A folder to which a file name is appended directly.
-    virtual std::string GetDataFolder(int folderCode) = 0;
-    virtual std::string GetParameterFile() = 0;
-    virtual void RegisterModule(const std::string& moduleName) = 0;
-    virtual void UnregisterModule(const std::string& moduleName) = 0;
-    // Owner of the module's modal dialogs; null for none.
-    virtual void* GetParentWindow() = 0;
-    virtual bool UnloadQuery() = 0;
-    // Full path of a data file, "" when not found.
-    virtual std::string FindDataFile(const std::string& fileName, int locationCode) = 0;
-    virtual void ShowCommandList(const std::string& title, const std::string& moduleName, int first,
-                                 int count, const std::vector<std::string>& lines) = 0;
-    // Text of a message number; it stays the main services module's.
-    virtual const char* GetMessageText(int number) = 0;
-};
-
-// Operations of the configuration services module's service object.
-class CVelConfigServices : public AcRxService {
-public:
-    virtual void RegisterConfigPage(const std::string& section, const std::string& createFunction,
-                                    const std::string& moduleName, const std::string& pageTitle) = 0;
-};
-
-// The two service objects (the host ends when a module is missing).
+// The main services module's service object (the host ends when the module is missing).
 CVelMainServices* MainServices();
-CVelConfigServices* ConfigServices();
 
 // Signatures of the sibling functions called with simple arguments.
 using Rsx_WriteXDataMetresFn = std::int32_t();

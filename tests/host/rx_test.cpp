@@ -1,0 +1,184 @@
+// Module loading, the service dictionary, service symbols and the fatal exit.
+#include "velhost/rx.h"
+
+#include <gtest/gtest.h>
+
+#include <filesystem>
+#include <fstream>
+
+#include "host_fixture.hpp"
+#include "velhost/commands.h"
+#include "velhost/profile.h"
+
+namespace {
+
+std::string ModulePath(const char* name)
+{
+    return (std::filesystem::path(VEL_TEST_MODULE_DIR) / name).string();
+}
+
+class DynamicLinker : public ::testing::Test {
+protected:
+    void SetUp() override
+    {
+        velHostSettings().modulesDir = VEL_TEST_MODULE_DIR;
+    }
+    void TearDown() override
+    {
+        velUnloadAllModules();
+        velHostSettings().modulesDir.clear();
+    }
+    ScriptedSession session;
+};
+
+TEST_F(DynamicLinker, LoadFailuresSayWhichStepFailed)
+{
+    struct Case {
+        const char* name;
+        const char* expected;
+    };
+    const Case cases[] = {
+        {"absent_module.arx", "Impossible de trouver le module absent_module.arx."},
+        {"entryless_module.arx", "n'exporte pas de point d'entrée acrxEntryPoint"},
+        {"refusing_module.arx", "a refusé de démarrer (réponse 3)"},
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.name);
+        session.ClearOutput();
+        EXPECT_FALSE(acrxLoadModule(c.name, false));
+        EXPECT_NE(session.Output().find(c.expected), std::string::npos) << session.Output();
+    }
+    EXPECT_TRUE(velLoadedModules().empty());
+    // What the refusing module registered before refusing went with it.
+    EXPECT_FALSE(acrxServiceIsRegistered("VelTestRefusingService"));
+}
+
+TEST_F(DynamicLinker, NotASharedLibraryIsReported)
+{
+    const std::string bogus = (std::filesystem::temp_directory_path() / "vel_bogus_module.arx").string();
+    {
+        std::ofstream(bogus) << "pas une bibliothèque";
+    }
+    EXPECT_FALSE(acrxLoadModule(bogus.c_str(), false));
+    EXPECT_NE(session.Output().find("Impossible d'ouvrir le module " + bogus), std::string::npos);
+    std::filesystem::remove(bogus);
+}
+
+TEST_F(DynamicLinker, ServiceSymbolsComeFromTheRegisteringModule)
+{
+    ASSERT_TRUE(acrxLoadModule("good_module", true));
+    EXPECT_NE(session.Output().find("good: init"), std::string::npos);
+    EXPECT_NE(session.Output().find("Module " + ModulePath("good_module.arx") + " chargé."), std::string::npos);
+    ASSERT_TRUE(acrxServiceIsRegistered("VelTestGoodService"));
+    auto answer = reinterpret_cast<int (*)()>(acrxGetServiceSymbolAddr("VelTestGoodService", "VelTest_Answer"));
+    ASSERT_NE(answer, nullptr);
+    EXPECT_EQ(answer(), 42);
+    EXPECT_EQ(acrxGetServiceSymbolAddr("VelTestGoodService", "Absent"), nullptr);
+    EXPECT_EQ(acrxGetServiceSymbolAddr("NoSuchService", "VelTest_Answer"), nullptr);
+    // A second load of the same file starts nothing.
+    session.ClearOutput();
+    EXPECT_TRUE(acrxLoadModule(ModulePath("good_module.arx").c_str(), false));
+    EXPECT_EQ(session.Output().find("good: init"), std::string::npos);
+    EXPECT_EQ(velLoadedModules().size(), 1u);
+}
+
+TEST_F(DynamicLinker, UnloadGoesInReverseOrderAndCleansUp)
+{
+    ASSERT_TRUE(acrxLoadModule("good_module.arx", false));
+    ASSERT_TRUE(acrxLoadModule("sloppy_module.arx", false));
+    session.ClearOutput();
+    velUnloadAllModules();
+    const std::string out = session.Output();
+    const auto sloppy = out.find("sloppy: unload");
+    const auto good = out.find("good: unload");
+    ASSERT_NE(sloppy, std::string::npos);
+    ASSERT_NE(good, std::string::npos);
+    EXPECT_LT(sloppy, good);
+    EXPECT_NE(out.find("n'a pas retiré le service VelTestSloppyService"), std::string::npos);
+    EXPECT_NE(out.find("n'a pas retiré le groupe de commandes VELTEST_SLOPPY"), std::string::npos);
+    EXPECT_FALSE(acrxServiceIsRegistered("VelTestSloppyService"));
+    EXPECT_EQ(acedRegCmds()->lookupCmd("VelTestHello"), nullptr);
+    EXPECT_TRUE(velLoadedModules().empty());
+}
+
+TEST_F(DynamicLinker, LockedModuleStaysUntilForced)
+{
+    ASSERT_TRUE(acrxLoadModule("sloppy_module.arx", false));
+    EXPECT_TRUE(acrxDynamicLinker()->isApplicationLocked("sloppy_module"));
+    EXPECT_FALSE(acrxUnloadModule("sloppy_module", true));
+    EXPECT_NE(session.Output().find("est verrouillé"), std::string::npos);
+    EXPECT_EQ(velLoadedModules().size(), 1u);
+    ASSERT_TRUE(acrxLoadModule("good_module.arx", false));
+    EXPECT_TRUE(acrxUnloadModule("GOOD_MODULE.ARX", true));
+    EXPECT_EQ(velLoadedModules().size(), 1u);
+}
+
+TEST_F(DynamicLinker, AppNameIsTheRunningModule)
+{
+    ASSERT_TRUE(acrxLoadModule("good_module.arx", false));
+    EXPECT_STREQ(acedGetAppName(), "");
+    std::string error;
+    session.ClearOutput();
+    ASSERT_EQ(velRunCommand("TestNom", error), VelCommandResult::kDone) << error;
+    EXPECT_NE(session.Output().find("module=" + ModulePath("good_module.arx")), std::string::npos);
+}
+
+TEST_F(DynamicLinker, AbortDuringStartUpLeavesNothingLoaded)
+{
+    AbortCatcher catcher;
+    try {
+        acrxLoadModule("aborting_module.arx", false);
+        FAIL() << "acrx_abort did not end the load";
+    } catch (const AbortCalled& abort) {
+        EXPECT_EQ(abort.message, "Impossible de trouver le module <Absent.arx>!!!");
+    }
+    EXPECT_TRUE(velLoadedModules().empty());
+}
+
+TEST(ServiceDictionary, InProcessServiceAnswersItsTable)
+{
+    static AcRxService service;
+    static int marker = 5;
+    velRegisterInProcessService("VelTestInProcess", &service, {{"Marker", &marker}});
+    EXPECT_TRUE(acrxServiceIsRegistered("VelTestInProcess"));
+    EXPECT_EQ(acrxGetServiceSymbolAddr("VelTestInProcess", "Marker"), &marker);
+    EXPECT_EQ(acrxGetServiceSymbolAddr("VelTestInProcess", "Other"), nullptr);
+    auto* dict = static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"));
+    EXPECT_EQ(dict->at("VelTestInProcess"), &service);
+    // Once taken out of the dictionary, its symbols are gone too.
+    EXPECT_EQ(dict->remove("VelTestInProcess"), &service);
+    EXPECT_FALSE(acrxServiceIsRegistered("VelTestInProcess"));
+    EXPECT_EQ(acrxGetServiceSymbolAddr("VelTestInProcess", "Marker"), nullptr);
+}
+
+TEST(ServiceDictionary, KeysAreExactAndSorted)
+{
+    AcRxDictionary dict;
+    AcRxObject a, b;
+    EXPECT_EQ(dict.atPut("b", &b), nullptr);
+    EXPECT_EQ(dict.atPut("a", &a), nullptr);
+    EXPECT_EQ(dict.atPut("b", &a), &b);
+    EXPECT_EQ(dict.at("B"), nullptr);
+    EXPECT_EQ(dict.keys(), (std::vector<std::string>{"a", "b"}));
+    EXPECT_EQ(dict.atPut("", &a), nullptr);
+    EXPECT_EQ(dict.numEntries(), 2u);
+}
+
+TEST(Abort, HandlerReceivesTheFormattedMessage)
+{
+    AbortCatcher catcher;
+    try {
+        acrx_abort("Pas de service <%s>\nenregistré par le module <%s>!!!", "S", "/m/x.arx");
+    } catch (const AbortCalled& abort) {
+        EXPECT_EQ(abort.message, "Pas de service <S>\nenregistré par le module </m/x.arx>!!!");
+        return;
+    }
+    FAIL();
+}
+
+TEST(AbortDeathTest, DefaultEndsTheProcessWithFailure)
+{
+    EXPECT_EXIT(acrx_abort("fin %d", 1), ::testing::ExitedWithCode(1), "Erreur fatale : fin 1");
+}
+
+} // namespace

@@ -288,7 +288,7 @@ Acad::ErrorStatus acdbOpenObject(T*& object, AcDbObjectId id, AcDb::OpenMode mod
   if (status != Acad::eOk) return status;
   object = dynamic_cast<T*>(any);
   if (object == nullptr) {
-    any->close();
+    if (any != nullptr) any->close();
     return Acad::eNotThatKindOfClass;
   }
   return Acad::eOk;

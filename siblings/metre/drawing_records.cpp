@@ -1,0 +1,272 @@
+// Reading project quantity records (XData of application "DAZUVUVUD") and keeping the
+// metre module's estimate records in an XRECORD dictionary of the drawing.
+#include "drawing_records.hpp"
+
+#include "text/text.hpp"
+#include "velhost/dbase.h"
+#include "velhost/resbuf.h"
+
+#include <cstring>
+
+namespace metre {
+
+namespace {
+
+struct ProjectGroup {
+    int kind;
+    const char* first;
+    const char* second;
+};
+
+constexpr ProjectGroup kGroups[] = {
+    {3, "VELANTO_RSX_VRD", "PROJECTS"},
+    {2, "VELANTO_ROUT2_DICT", "VELANTO_ROUT2_PROJ"},
+    {4, "KORVANE", "KORVANE_PROJET"},
+    {1, "VELANTO_PFM_VRD", "PROJECTS"},
+};
+
+constexpr const char* kProjectApp = "DAZUVUVUD";
+
+// Closes an opened object on every way out.
+struct Closer {
+    AcDbObject* object = nullptr;
+    ~Closer()
+    {
+        if (object != nullptr)
+            object->close();
+    }
+};
+
+double QuantityOf(const resbuf* item)
+{
+    switch (item->restype) {
+    case kXdAsciiString: {
+        // The leading numeric part of the text, as the drawing's writers intend.
+        const char* text = item->resval.rstring ? item->resval.rstring : "";
+        std::size_t end = std::strspn(text, " \t");
+        const std::size_t start = end;
+        if (text[end] == '+' || text[end] == '-')
+            ++end;
+        end += std::strspn(text + end, "0123456789");
+        if (text[end] == '.')
+            end += 1 + std::strspn(text + end + 1, "0123456789");
+        for (std::size_t stop = end; stop > start; --stop)
+            if (const auto value = ParseReal(std::string_view(text + start, stop - start)))
+                return *value;
+        return 0;
+    }
+    case kXdReal:
+    case kXdDist:
+    case kXdScale:
+        return item->resval.rreal;
+    case kXdInteger16:
+        return item->resval.rint;
+    case kXdInteger32:
+        return item->resval.rlong;
+    default:
+        return 0;
+    }
+}
+
+// The project's name and quantities from its record; false when the head is malformed.
+bool ReadRecord(const resbuf* list, std::string& name, QuantityList& quantities)
+{
+    const resbuf* item = list ? list->rbnext : nullptr;
+    if (item == nullptr || item->restype != kXdAsciiString || velRbText(item) != "PRJ_NOM")
+        return false;
+    item = item->rbnext;
+    if (item == nullptr || item->restype != kXdAsciiString)
+        return false;
+    name = velRbText(item);
+    for (item = item->rbnext; item != nullptr && item->restype == kXdAsciiString; item = item->rbnext) {
+        const std::string key = velRbText(item);
+        item = item->rbnext;
+        if (item == nullptr)
+            break;
+        const double quantity = QuantityOf(item);
+        bool replaced = false;
+        for (auto& entry : quantities)
+            if (entry.first == key) {
+                entry.second = quantity;
+                replaced = true;
+            }
+        if (!replaced)
+            quantities.emplace_back(key, quantity);
+    }
+    return true;
+}
+
+resbuf* EstimateData(const EstimateRecord& record)
+{
+    VelRbBuilder builder;
+    builder.add(velRbString(1, record.name));
+    builder.add(velRbString(1, record.workbookPath));
+    builder.add(velRbString(1, record.csvPath));
+    builder.add(velRbLong(90, record.lineCount));
+    builder.add(velRbReal(40, record.totalExclTax));
+    builder.add(velRbReal(40, record.totalInclTax));
+    return builder.release();
+}
+
+} // namespace
+
+ProjectTables ProjectTables::Read(AcDbDatabase& database)
+{
+    ProjectTables tables;
+    AcDbDictionary* named = nullptr;
+    if (database.getNamedObjectsDictionary(named, AcDb::kForRead) != Acad::eOk)
+        return tables;
+    Closer namedCloser{named};
+    for (const ProjectGroup& group : kGroups) {
+        AcDbObject* firstObject = nullptr;
+        if (named->getAt(group.first, firstObject, AcDb::kForRead) != Acad::eOk)
+            continue;
+        Closer firstCloser{firstObject};
+        auto* first = dynamic_cast<AcDbDictionary*>(firstObject);
+        AcDbObject* secondObject = nullptr;
+        if (first == nullptr || first->getAt(group.second, secondObject, AcDb::kForRead) != Acad::eOk)
+            continue;
+        Closer secondCloser{secondObject};
+        auto* second = dynamic_cast<AcDbDictionary*>(secondObject);
+        if (second == nullptr)
+            continue;
+        std::unique_ptr<AcDbDictionaryIterator> it(second->newIterator(AcRx::kDictSorted));
+        for (; !it->done(); it->next()) {
+            AcDbObject* entry = nullptr;
+            if (it->getObject(entry, AcDb::kForRead) != Acad::eOk)
+                continue;
+            Closer entryCloser{entry};
+            VelRbPtr data(entry->xData(kProjectApp));
+            std::string name;
+            QuantityList quantities;
+            if (data && ReadRecord(data.get(), name, quantities))
+                tables.Add(group.kind, name, std::move(quantities));
+        }
+    }
+    return tables;
+}
+
+void ProjectTables::Add(int projectKind, const std::string& project, QuantityList quantities)
+{
+    tables_[projectKind][project] = std::move(quantities);
+}
+
+bool ProjectTables::HasProject(int projectKind, const std::string& project) const
+{
+    const auto kind = tables_.find(projectKind);
+    return kind != tables_.end() && kind->second.count(project) != 0;
+}
+
+std::optional<double> ProjectTables::Quantity(int projectKind, const std::string& project, const std::string& key) const
+{
+    const auto kind = tables_.find(projectKind);
+    if (kind == tables_.end())
+        return std::nullopt;
+    const auto found = kind->second.find(project);
+    if (found == kind->second.end())
+        return std::nullopt;
+    for (const auto& entry : found->second)
+        if (entry.first == key)
+            return entry.second;
+    for (const auto& entry : found->second)
+        if (EqualsNoCase(entry.first, key))
+            return entry.second;
+    return std::nullopt;
+}
+
+bool RecordEstimate(AcDbDatabase& database, const EstimateRecord& record, std::string& error)
+{
+    const auto refused = [&](const char* what, Acad::ErrorStatus status) {
+        error = FormatString("Le devis « %s » n'est pas enregistré dans le dessin : %s (%s).", record.name.c_str(), what,
+                             acadErrorStatusText(status));
+        return false;
+    };
+    AcDbDictionary* named = nullptr;
+    Acad::ErrorStatus status = database.getNamedObjectsDictionary(named, AcDb::kForWrite);
+    if (status != Acad::eOk)
+        return refused("dictionnaire des objets nommés inaccessible", status);
+    Closer namedCloser{named};
+    AcDbObject* folderObject = nullptr;
+    if (named->getAt(kEstimateDictionary, folderObject, AcDb::kForWrite) != Acad::eOk) {
+        auto* created = new AcDbDictionary();
+        AcDbObjectId id;
+        status = named->setAt(kEstimateDictionary, created, id);
+        if (status != Acad::eOk) {
+            delete created;
+            return refused("dictionnaire des devis impossible à créer", status);
+        }
+        folderObject = created;
+    }
+    Closer folderCloser{folderObject};
+    auto* folder = dynamic_cast<AcDbDictionary*>(folderObject);
+    if (folder == nullptr)
+        return refused("l'entrée des devis n'est pas un dictionnaire", Acad::eNotThatKindOfClass);
+    VelRbPtr data(EstimateData(record));
+    AcDbObject* existing = nullptr;
+    if (folder->getAt(record.name, existing, AcDb::kForWrite) == Acad::eOk) {
+        Closer existingCloser{existing};
+        auto* xrecord = dynamic_cast<AcDbXrecord*>(existing);
+        if (xrecord == nullptr)
+            return refused("une entrée du même nom n'est pas un devis", Acad::eNotThatKindOfClass);
+        status = xrecord->setFromRbChain(data.get());
+        return status == Acad::eOk || refused("données refusées", status);
+    }
+    auto* xrecord = new AcDbXrecord();
+    AcDbObjectId id;
+    status = folder->setAt(record.name, xrecord, id);
+    if (status != Acad::eOk) {
+        delete xrecord;
+        return refused("nom refusé", status);
+    }
+    Closer recordCloser{xrecord};
+    status = xrecord->setFromRbChain(data.get());
+    return status == Acad::eOk || refused("données refusées", status);
+}
+
+std::vector<EstimateRecord> RecordedEstimates(AcDbDatabase& database)
+{
+    std::vector<EstimateRecord> records;
+    AcDbDictionary* named = nullptr;
+    if (database.getNamedObjectsDictionary(named, AcDb::kForRead) != Acad::eOk)
+        return records;
+    Closer namedCloser{named};
+    AcDbObject* folderObject = nullptr;
+    if (named->getAt(kEstimateDictionary, folderObject, AcDb::kForRead) != Acad::eOk)
+        return records;
+    Closer folderCloser{folderObject};
+    auto* folder = dynamic_cast<AcDbDictionary*>(folderObject);
+    if (folder == nullptr)
+        return records;
+    std::unique_ptr<AcDbDictionaryIterator> it(folder->newIterator(AcRx::kDictSorted));
+    for (; !it->done(); it->next()) {
+        AcDbObject* entry = nullptr;
+        if (it->getObject(entry, AcDb::kForRead) != Acad::eOk)
+            continue;
+        Closer entryCloser{entry};
+        auto* xrecord = dynamic_cast<AcDbXrecord*>(entry);
+        if (xrecord == nullptr)
+            continue;
+        resbuf* raw = nullptr;
+        xrecord->rbChain(raw);
+        VelRbPtr data(raw);
+        EstimateRecord record;
+        record.name = it->name();
+        int texts = 0, reals = 0;
+        for (const resbuf* item = data.get(); item != nullptr; item = item->rbnext) {
+            if (item->restype == 1) {
+                std::string& target = texts == 0 ? record.name : texts == 1 ? record.workbookPath : record.csvPath;
+                if (texts < 3)
+                    target = velRbText(item);
+                ++texts;
+            } else if (item->restype == 90) {
+                record.lineCount = item->resval.rlong;
+            } else if (item->restype == 40) {
+                (reals++ == 0 ? record.totalExclTax : record.totalInclTax) = item->resval.rreal;
+            }
+        }
+        records.push_back(std::move(record));
+    }
+    return records;
+}
+
+} // namespace metre

@@ -37,23 +37,9 @@ TEST(UpdateStripping, OneVolumeAndOneSurfacePerThickness)
     EXPECT_EQ(group[0]->unit, "m³");
     EXPECT_EQ(group[2]->unit, "m²");
     EXPECT_EQ(group[0]->designation, "Volume de décapage sur une épaisseur de 0.20 m");
-    EXPECT_EQ(group[0]->treePath,
-              R"(Voirie\\Terrassements\\Terre végétale\\Décapage\\Volumique\\GC-001 - Volume de décapage sur une épaisseur de 0.20 m)");
-    EXPECT_EQ(group[3]->description, "Article associé aux projets 'multi plates-formes', 'projet linéaire par "
-                                     "profils-types' et 'Korvane'.\nSurface 3D totale de décapage sur une épaisseur de 0.30 m.");
+    EXPECT_EQ(group[0]->treePath, R"(Voirie\\Terrassements\\Terre végétale\\Décapage\\Volumique\\GC-001 - )" +
+                                      group[0]->designation);
     EXPECT_FALSE(UpdateStripping(bdr, {0.20, 0.30}));
-}
-
-TEST(UpdateVegetation, IsDistinctFromStripping)
-{
-    CZodEVIBdr bdr;
-    UpdateStripping(bdr, {0.25});
-    EXPECT_TRUE(UpdateVegetation(bdr, {0.25}));
-    EXPECT_EQ(RoadKeys(bdr), (Names{"PRJ_VOL_TOT_DEC_0.250", "PRJ_SFC_DEC_3D_0.250", "PRJ_VOL_TOT_VEG_0.250",
-                                    "PRJ_SFC_TOT_VEG_0.250"}));
-    PurgeFlag flag(true);
-    EXPECT_TRUE(UpdateVegetation(bdr, {}));
-    EXPECT_EQ(RoadKeys(bdr), (Names{"PRJ_VOL_TOT_DEC_0.250", "PRJ_SFC_DEC_3D_0.250"}));
 }
 
 TEST(UpdatePlaning, ClassesStartAtZeroAndRepeatingChangesNothing)
@@ -75,14 +61,16 @@ TEST(EarthworkPurge, SparesTheOtherFamiliesOfTheRoadGroup)
 {
     CZodEVIBdr bdr;
     UpdateMaterials(bdr, {"Grave"}, {}, {});
-    UpdateStripping(bdr, {12.5, 0.2});
-    UpdatePlaning(bdr, {});
+    UpdateStripping(bdr, {12.5, 0.25});
+    // Vegetation and stripping of one thickness are distinct articles.
+    EXPECT_TRUE(UpdateVegetation(bdr, {0.25}));
     PurgeFlag flag(true);
     // An empty list removes the family's articles that the length test admits:
     // PRJ_VOL_TOT_DEC_12.500 is longer than the sample PRJ_VOL_TOT_DEC_0.000.
     EXPECT_TRUE(UpdateStripping(bdr, {}));
     EXPECT_EQ(RoadKeys(bdr), (Names{"PRJ_VOL_MAT_Grave", "PRJ_TON_MAT_Grave", "PRJ_VOL_RPF_Grave",
-                                    "PRJ_VOL_TOT_DEC_12.500", "PRJ_SFC_DEC_3D_12.500"}));
+                                    "PRJ_VOL_TOT_DEC_12.500", "PRJ_SFC_DEC_3D_12.500", "PRJ_VOL_TOT_VEG_0.250",
+                                    "PRJ_SFC_TOT_VEG_0.250"}));
     EXPECT_FALSE(UpdatePlaning(bdr, {}));
 }
 

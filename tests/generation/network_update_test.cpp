@@ -100,38 +100,38 @@ TEST(UpdateNetwork, FirstUpdateMakesTheFixedArticlesInOrder)
     EXPECT_EQ(*bdr.NetworkIndexOf("PRJ_RES(EU 1)"), 1);
 }
 
-TEST(UpdateNetwork, SecondIdenticalUpdateChangesNothing)
+TEST(UpdateNetwork, SecondIdenticalUpdateChangesNothingAndKeepsUserEdits)
 {
     for (bool purge : {false, true}) {
         SCOPED_TRACE(purge ? "purge" : "no purge");
         PurgeFlag flag(purge);
         CZodEVIBdr bdr;
-        const Names models = {"PVC 200", "Fonte 300"};
-        const Bounds bounds = {1.30, 2.00, 3.50};
-        ASSERT_TRUE(UpdateNetwork(bdr, 1, "EU 1", models, {"Joint"}, {"Regard 1000"}, {"Tampon"}, {"TPC 90"},
-                                  {"Grave"}, bounds));
+        const auto update = [&] {
+            return UpdateNetwork(bdr, 1, "EU 1", {"PVC 200"}, {"Joint"}, {"Regard"}, {"Tampon"}, {"TPC 90"},
+                                 {"Grave"}, {1.30, 2.00, 3.50});
+        };
+        ASSERT_TRUE(update());
+        for (const auto& article : bdr.Articles()) {
+            article->unitPrice = 12.5;
+            article->designation += " (négocié)";
+        }
         const std::size_t count = bdr.Articles().size();
-        EXPECT_FALSE(UpdateNetwork(bdr, 1, "EU 1", models, {"Joint"}, {"Regard 1000"}, {"Tampon"}, {"TPC 90"},
-                                   {"Grave"}, bounds));
-        EXPECT_EQ(bdr.Articles().size(), count);
+        EXPECT_FALSE(update());
+        ASSERT_EQ(bdr.Articles().size(), count);
+        for (const auto& article : bdr.Articles()) {
+            EXPECT_EQ(article->unitPrice, 12.5);
+            EXPECT_TRUE(article->designation.ends_with(" (négocié)"));
+        }
     }
 }
 
 TEST(UpdateNetwork, EmptyPrefixTakesTheFirstTwoCharactersOfTheName)
 {
     CZodEVIBdr bdr;
-    ASSERT_TRUE(Update(bdr, 12, "Réseau X", {"Câble 3x2"}));
-    const CZodEVIArticle* total = ByKey(bdr, "Réseau X", "RSX_LIN_TOT_3D");
-    ASSERT_NE(total, nullptr);
-    EXPECT_EQ(total->code, "Ré-001");
-    EXPECT_EQ(total->treePath, R"(Réseau X\\Câble\\Linéaire\\Ré-001 - Longueur 3D totale)");
-    EXPECT_EQ(total->description, "Longueur 3D totale (SurLongueur comprise) des câbles");
-    const CZodEVIArticle* model = ByKey(bdr, "Réseau X", "RSX_TUY_LIN_3D_Câble 3x2");
-    ASSERT_NE(model, nullptr);
-    EXPECT_EQ(model->code, "Ré-002");
-    EXPECT_EQ(model->designation, "Fourniture et pose de câble Câble 3x2");
-    // Branch articles exist for EP and EU networks only.
-    EXPECT_EQ(ByKey(bdr, "Réseau X", "RSX_BRA_LIN_3D"), nullptr);
+    ASSERT_TRUE(Update(bdr, 12, "Réseau X", {"C 3x2"}));
+    EXPECT_EQ(ByKey(bdr, "Réseau X", "RSX_LIN_TOT_3D")->treePath, R"(Réseau X\\Câble\\Linéaire\\Ré-001 - Longueur 3D totale)");
+    EXPECT_EQ(ByKey(bdr, "Réseau X", "RSX_TUY_LIN_3D_C 3x2")->code, "Ré-002");
+    EXPECT_EQ(ByKey(bdr, "Réseau X", "RSX_BRA_LIN_3D"), nullptr); // EP and EU only
 }
 
 TEST(UpdateNetwork, DepthBoundsMakeOneArticlePerClass)
@@ -156,45 +156,14 @@ TEST(UpdateNetwork, DepthBoundsMakeOneArticlePerClass)
         ASSERT_EQ(keys.size(), 20 + c.keys.size());
         EXPECT_EQ(Names(keys.begin() + 20, keys.end()), c.keys);
     }
-    CZodEVIBdr bdr;
-    Update(bdr, 1, "EU 1", {}, {}, {1.30, 2.00, 3.50});
-    const CZodEVIArticle* pair = ByKey(bdr, "EU 1", "RSX_VOL_1.30_2.00");
-    ASSERT_NE(pair, nullptr);
-    EXPECT_EQ(pair->designation, "Volume de fouille 1.30 m <= H <= 2.00 m");
-    EXPECT_EQ(pair->treePath,
-              R"(EU 1\\Travaux de génie civil\\Terrassements\\Tranchées\\Volumique\\GC-016 - Volume de fouille 1.30 m <= H <= 2.00 m)");
     // The branch-trench class of the last bound has two placeholders for one value: the
     // bound fills both.
+    CZodEVIBdr bdr;
+    Update(bdr, 1, "EU 1", {}, {}, {1.30, 2.00, 3.50});
     const CZodEVIArticle* branch = ByKey(bdr, "EU 1", "RSX_BRA_VOL_3.50");
     ASSERT_NE(branch, nullptr);
     EXPECT_EQ(branch->designation, "Longueur 2D 3.50 m <= H <= 3.50 m");
-    EXPECT_EQ(branch->description, "Article associé aux réseaux EU.\r\nLongueur 2D totale des tranchées aassociées "
-                                   "aux branchements ayant un volume de fouille pour 3.50 m <= H <= 3.50 m.");
-    EXPECT_EQ(branch->unit, "m³");
-    EXPECT_EQ(branch->nature, kNatureLinear);
-}
-
-TEST(UpdateNetwork, UserEditsSurviveEveryUpdate)
-{
-    PurgeFlag flag(true);
-    CZodEVIBdr bdr;
-    const Names models = {"PVC 200"};
-    const Bounds bounds = {1.30, 2.00};
-    Update(bdr, 1, "EU 1", models, {"Grave"}, bounds);
-    for (const auto& article : bdr.Articles()) {
-        article->unitPrice = 12.5;
-        article->designation += " (prix négocié)";
-        article->metreText3 = "note";
-    }
-    const std::size_t count = bdr.Articles().size();
-    EXPECT_FALSE(Update(bdr, 1, "EU 1", models, {"Grave"}, bounds));
-    ASSERT_EQ(bdr.Articles().size(), count);
-    for (const auto& article : bdr.Articles()) {
-        SCOPED_TRACE(article->quantityKey);
-        EXPECT_EQ(article->unitPrice, 12.5);
-        EXPECT_TRUE(article->designation.ends_with(" (prix négocié)"));
-        EXPECT_EQ(article->metreText3, "note");
-    }
+    EXPECT_TRUE(branch->description.ends_with("volume de fouille pour 3.50 m <= H <= 3.50 m.")) << branch->description;
 }
 
 TEST(UpdateNetwork, PurgeRemovesOnlyTheModelsNoLongerListed)
@@ -203,71 +172,43 @@ TEST(UpdateNetwork, PurgeRemovesOnlyTheModelsNoLongerListed)
     CZodEVIBdr bdr;
     Update(bdr, 1, "EU 1", {"PVC 200", "PVC 300"}, {}, {}, {"Regard 1000"});
     Update(bdr, 1, "EU 2", {"PVC 200"});
-    Names before = Keys(GroupOf(bdr, "EU 1"));
+    Names expected = Keys(GroupOf(bdr, "EU 1"));
+    std::erase(expected, "RSX_TUY_LIN_3D_PVC 200");
+    std::erase(expected, "RSX_TUY_NB_PVC 200");
     const std::size_t total = bdr.Articles().size();
-
     EXPECT_TRUE(Update(bdr, 1, "EU 1", {"PVC 300"}, {}, {}, {"Regard 1000"}));
-    std::erase(before, "RSX_TUY_LIN_3D_PVC 200");
-    std::erase(before, "RSX_TUY_NB_PVC 200");
-    EXPECT_EQ(Keys(GroupOf(bdr, "EU 1")), before);
+    EXPECT_EQ(Keys(GroupOf(bdr, "EU 1")), expected);
     EXPECT_EQ(bdr.Articles().size(), total - 2);
-    // The other network keeps its own article of that model.
     EXPECT_NE(ByKey(bdr, "EU 2", "RSX_TUY_LIN_3D_PVC 200"), nullptr);
-    // Without the purge flag nothing goes.
-    SetPurgeFlag(false);
-    EXPECT_FALSE(Update(bdr, 1, "EU 1", {}, {}, {}, {}));
-    EXPECT_EQ(bdr.Articles().size(), total - 2);
 }
 
 TEST(UpdateNetwork, DepthPurgeKeepsMaterialsThatLookLikeClasses)
 {
     PurgeFlag flag(true);
     CZodEVIBdr bdr;
-    // RSX_VOL_DEC_Grave has the length of the class sample RSX_VOL_0.00_0.00, and
-    // RSX_VOL_DEC_ that of RSX_VOL_0.00; neither is a depth class.
+    // RSX_VOL_DEC_Grave is as long as the class sample RSX_VOL_0.00_0.00, and
+    // RSX_VOL_DEC_ as RSX_VOL_0.00; neither is a depth class.
     const Names materials = {"Grave", ""};
-    const Bounds bounds = {1.30, 2.00};
-    Update(bdr, 1, "EU 1", {}, materials, bounds);
+    Update(bdr, 1, "EU 1", {}, materials, {1.30, 2.00});
     CZodEVIArticle* grave = const_cast<CZodEVIArticle*>(ByKey(bdr, "EU 1", "RSX_VOL_DEC_Grave"));
     ASSERT_NE(grave, nullptr);
     grave->unitPrice = 31;
-    const std::string code = grave->code;
-    const int number = grave->number;
-    ASSERT_NE(ByKey(bdr, "EU 1", "RSX_VOL_DEC_"), nullptr);
+    EXPECT_FALSE(Update(bdr, 1, "EU 1", {}, materials, {1.30, 2.00}));
+    EXPECT_EQ(ByKey(bdr, "EU 1", "RSX_VOL_DEC_Grave"), grave);
+    EXPECT_EQ(grave->unitPrice, 31);
 
-    EXPECT_FALSE(Update(bdr, 1, "EU 1", {}, materials, bounds));
-    const CZodEVIArticle* again = ByKey(bdr, "EU 1", "RSX_VOL_DEC_Grave");
-    ASSERT_EQ(again, grave);
-    EXPECT_EQ(again->code, code);
-    EXPECT_EQ(again->number, number);
-    EXPECT_EQ(again->unitPrice, 31);
-    EXPECT_NE(ByKey(bdr, "EU 1", "RSX_VOL_DEC_"), nullptr);
-
-    // New bounds remove the obsolete classes, and only them.
-    EXPECT_TRUE(Update(bdr, 1, "EU 1", {}, materials, {1.50}));
+    // New bounds remove the obsolete classes and only them; RSX_VOL_12.50 is longer than
+    // the sample and stays, and every listed bound is kept, not only the last.
+    Update(bdr, 1, "EU 1", {}, materials, {12.50});
+    EXPECT_TRUE(Update(bdr, 1, "EU 1", {}, materials, {1.50, 2.50}));
     const Names keys = Keys(GroupOf(bdr, "EU 1"));
-    const Names tail(keys.begin() + 20, keys.end());
-    EXPECT_EQ(tail, (Names{"RSX_VOL_DEC_Grave", "RSX_VOL_DEC_", "RSX_VOL_1.50", "RSX_LIN_1.50_2D", "RSX_BRA_VOL_1.50"}));
-}
-
-TEST(UpdateNetwork, ValuePurgeKeepsLongerKeysAndEveryListedBound)
-{
-    PurgeFlag flag(true);
-    CZodEVIBdr bdr;
-    Update(bdr, 1, "EU 1", {}, {}, {12.50});
-    Update(bdr, 1, "EU 1", {}, {}, {2.00});
-    // The sample key RSX_VOL_0.00 is shorter than RSX_VOL_12.50, which the purge of
-    // the last bound therefore leaves alone.
-    EXPECT_NE(ByKey(bdr, "EU 1", "RSX_VOL_12.50"), nullptr);
-    EXPECT_NE(ByKey(bdr, "EU 1", "RSX_VOL_2.00"), nullptr);
-    // Every bound of the list is kept for the last-bound families, not only the last.
-    Update(bdr, 1, "EU 1", {}, {}, {2.00, 3.00});
-    EXPECT_NE(ByKey(bdr, "EU 1", "RSX_VOL_2.00"), nullptr);
+    EXPECT_EQ(Names(keys.begin() + 20, keys.end()),
+              (Names{"RSX_VOL_DEC_Grave", "RSX_VOL_DEC_", "RSX_VOL_12.50", "RSX_LIN_12.50_2D", "RSX_BRA_VOL_12.50",
+                     "RSX_VOL_1.50_2.50", "RSX_VOL_2.50", "RSX_LIN_1.50_2.50_2D", "RSX_LIN_2.50_2D",
+                     "RSX_BRA_VOL_1.50_2.50", "RSX_BRA_VOL_2.50"}));
+    Update(bdr, 1, "EU 1", {}, materials, {1.50, 2.50, 3.00});
+    EXPECT_NE(ByKey(bdr, "EU 1", "RSX_VOL_2.50"), nullptr);
     EXPECT_NE(ByKey(bdr, "EU 1", "RSX_VOL_3.00"), nullptr);
-    Update(bdr, 1, "EU 1", {}, {}, {3.00});
-    EXPECT_EQ(ByKey(bdr, "EU 1", "RSX_VOL_2.00"), nullptr);
-    EXPECT_NE(ByKey(bdr, "EU 1", "RSX_VOL_3.00"), nullptr);
-    EXPECT_NE(ByKey(bdr, "EU 1", "RSX_VOL_12.50"), nullptr);
 }
 
 TEST(UpdateNetwork, NamesAreNeverFormats)
@@ -275,16 +216,10 @@ TEST(UpdateNetwork, NamesAreNeverFormats)
     const std::string name = R"(PVC %s %d 100% "DN" \\ a\b %n)";
     CZodEVIBdr bdr;
     Update(bdr, 1, "EU %s 1", {name});
-    const CZodEVIArticle* total = ByKey(bdr, "EU %s 1", "RSX_LIN_TOT_3D");
-    ASSERT_NE(total, nullptr);
-    EXPECT_EQ(total->groupKey, "PRJ_RES(EU %s 1)");
-    EXPECT_TRUE(total->treePath.starts_with(R"(EU %s 1\\Canalisation EU\\)"));
+    EXPECT_TRUE(ByKey(bdr, "EU %s 1", "RSX_LIN_TOT_3D")->treePath.starts_with(R"(EU %s 1\\Canalisation EU\\)"));
     const CZodEVIArticle* model = ByKey(bdr, "EU %s 1", "RSX_TUY_LIN_3D_" + name);
     ASSERT_NE(model, nullptr);
     EXPECT_EQ(model->designation, "Fourniture et pose des canalisations " + name);
-    EXPECT_EQ(model->description,
-              "Article associé aux réseaux EU.\r\nLongueur 3D totale des canalisations de modèle " + name +
-                  ". Les branchements sont pris en compte !");
 
     // A sibling whose name holds backslashes still gives its true category.
     auto* moved = const_cast<CZodEVIArticle*>(model);
@@ -323,18 +258,6 @@ TEST(UpdateNetwork, NewArticlesJoinTheCategoryWhereTheUserKeepsTheirFamily)
         ASSERT_NE(article, nullptr);
         EXPECT_EQ(article->treePath, std::string(c.category) + R"(\\)" + article->code + " - " + article->designation);
     }
-}
-
-TEST(UpdateNetwork, FixedArticlesAreMadeOnlyForANewGroup)
-{
-    CZodEVIBdr bdr;
-    Update(bdr, 1, "EU 1");
-    ASSERT_TRUE(bdr.RemoveByTreePath(GroupOf(bdr, "EU 1")[0]->treePath));
-    EXPECT_FALSE(Update(bdr, 1, "EU 1"));
-    EXPECT_EQ(GroupOf(bdr, "EU 1").size(), 19u);
-    // A network index without texts makes no article at all.
-    EXPECT_FALSE(Update(bdr, 13, "Inconnu", {"PVC"}));
-    EXPECT_TRUE(GroupOf(bdr, "Inconnu").empty());
 }
 
 TEST(UpdateDepthClasses, AppliesBoundsToEveryNetworkByItsOwnName)

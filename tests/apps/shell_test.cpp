@@ -34,13 +34,6 @@ protected:
     std::string error;
 };
 
-TEST(ModuleFileName, AddsArxOnlyWithoutExtension)
-{
-    EXPECT_EQ(velModuleFileName("VelMetre15"), "VelMetre15.arx");
-    EXPECT_EQ(velModuleFileName("VelMetre15.arx"), "VelMetre15.arx");
-    EXPECT_EQ(velModuleFileName("/m/Vel.so"), "/m/Vel.so");
-}
-
 TEST_F(Shell, BuiltInFailuresSayWhy)
 {
     ScriptedSession session;

@@ -76,20 +76,6 @@ TEST_F(DocManager, CreateSwitchAndCloseAreAnnounced)
     EXPECT_EQ(acdbHostApplicationServices()->workingDatabase(), nullptr);
 }
 
-TEST_F(DocManager, NewDrawingsGetNumberedTitles)
-{
-    AcApDocManager* dm = acDocManagerPtr();
-    AcApDocument* a = dm->createDocument(nullptr, "");
-    AcApDocument* b = dm->createDocument(nullptr, "");
-    EXPECT_NE(a->docTitle(), b->docTitle());
-    EXPECT_EQ(a->docTitle().rfind("Dessin", 0), 0u);
-    std::unique_ptr<AcApDocumentIterator> it(dm->newAcApDocumentIterator());
-    std::vector<AcApDocument*> seen;
-    for (; !it->done(); it->step())
-        seen.push_back(it->document());
-    EXPECT_EQ(seen, (std::vector<AcApDocument*>{a, b}));
-}
-
 TEST_F(DocManager, CommandsLockTheCurrentDocument)
 {
     AcApDocument* doc = acDocManagerPtr()->createDocument(nullptr, "/tmp/l.dxf");
@@ -98,20 +84,6 @@ TEST_F(DocManager, CommandsLockTheCurrentDocument)
     acDocManagerPtr()->unlockAfterCommand("ZodEVICreate");
     EXPECT_EQ(recorder.events, (std::vector<std::string>{"lock 1 ZodEVICreate " + doc->docTitle(),
                                                          "lock 2 ZodEVICreate " + doc->docTitle()}));
-}
-
-TEST_F(DocManager, ResourceHandlesStack)
-{
-    AcApDocManager* dm = acDocManagerPtr();
-    int a = 0, b = 0;
-    EXPECT_FALSE(dm->popResourceHandle());
-    dm->pushResourceHandle(&a);
-    dm->pushResourceHandle(&b);
-    EXPECT_EQ(dm->currentResourceHandle(), &b);
-    EXPECT_TRUE(dm->popResourceHandle());
-    EXPECT_EQ(dm->currentResourceHandle(), &a);
-    EXPECT_TRUE(dm->popResourceHandle());
-    EXPECT_EQ(dm->currentResourceHandle(), nullptr);
 }
 
 } // namespace

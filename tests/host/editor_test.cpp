@@ -79,11 +79,4 @@ TEST(GetString, TakesTheLineOrItsFirstWord)
     EXPECT_EQ(acedGetString(true, "Nom : ", text), RTCAN);
 }
 
-TEST(Printf, FormatsWithoutTheLocale)
-{
-    ScriptedSession session;
-    EXPECT_EQ(acutPrintf("%s %.2f %d%%", "Total", 12.5, 100), 16);
-    EXPECT_EQ(session.Output(), "Total 12.50 100%");
-}
-
 } // namespace

@@ -3,7 +3,6 @@
 
 #include <gtest/gtest.h>
 
-#include <cstdlib>
 
 #include "temp_dir.hpp"
 #include "velhost/editor.h"
@@ -73,23 +72,6 @@ TEST_F(FindFile, AbsoluteNamesAreTakenAsTheyAre)
     EXPECT_EQ(acedFindFile(file.c_str(), found), RTNORM);
     EXPECT_EQ(found, file);
     EXPECT_EQ(acedFindFile(dir.File("ailleurs").c_str(), found), RTERROR);
-}
-
-TEST(Profile, DefaultFolderFollowsXdg)
-{
-    const char* old = std::getenv("XDG_CONFIG_HOME");
-    const std::string keep = old ? old : "";
-    setenv("XDG_CONFIG_HOME", "/tmp/xdg", 1);
-    EXPECT_EQ(velDefaultProfileDir(), "/tmp/xdg/velhost");
-    setenv("XDG_CONFIG_HOME", "", 1);
-    const char* home = std::getenv("HOME");
-    if (home != nullptr && *home != '\0') {
-        EXPECT_EQ(velDefaultProfileDir(), std::string(home) + "/.config/velhost");
-    }
-    if (old)
-        setenv("XDG_CONFIG_HOME", keep.c_str(), 1);
-    else
-        unsetenv("XDG_CONFIG_HOME");
 }
 
 } // namespace

@@ -40,17 +40,6 @@ TEST_F(Registry, ValuesRoundTripWithoutRegardToCase)
     EXPECT_FALSE(velRegSetValue("HKEY_NOTHING", "a", "x", "y"));
 }
 
-TEST_F(Registry, RootNames)
-{
-    for (const char* name : {"HKEY_LOCAL_MACHINE", "hkey_current_user", "HKEY_CLASSES_ROOT", "HKEY_USERS",
-                             "HKEY_PERFORMANCE_DATA", "HKEY_CURRENT_CONFIG", "HKEY_DYN_DATA"}) {
-        SCOPED_TRACE(name);
-        EXPECT_TRUE(velIsRegistryRoot(name));
-    }
-    EXPECT_FALSE(velIsRegistryRoot("HKEY_CURRENT_USER\\Software"));
-    EXPECT_FALSE(velIsRegistryRoot("params.ini"));
-}
-
 TEST_F(Registry, MalformedFileIsNamedAndLeftAlone)
 {
     struct Case {

@@ -151,19 +151,6 @@ TEST(ServiceDictionary, InProcessServiceAnswersItsTable)
     EXPECT_EQ(acrxGetServiceSymbolAddr("VelTestInProcess", "Marker"), nullptr);
 }
 
-TEST(ServiceDictionary, KeysAreExactAndSorted)
-{
-    AcRxDictionary dict;
-    AcRxObject a, b;
-    EXPECT_EQ(dict.atPut("b", &b), nullptr);
-    EXPECT_EQ(dict.atPut("a", &a), nullptr);
-    EXPECT_EQ(dict.atPut("b", &a), &b);
-    EXPECT_EQ(dict.at("B"), nullptr);
-    EXPECT_EQ(dict.keys(), (std::vector<std::string>{"a", "b"}));
-    EXPECT_EQ(dict.atPut("", &a), nullptr);
-    EXPECT_EQ(dict.numEntries(), 2u);
-}
-
 TEST(Abort, HandlerReceivesTheFormattedMessage)
 {
     AbortCatcher catcher;

@@ -1,0 +1,46 @@
+// The schedule's exchange with the metre module: reading the file into the store (with
+// the project-wide articles), writing it back, the editor and its changes, and the price
+// queries by quantity selector.
+#pragma once
+
+#include "schedule/schedule_store.hpp"
+
+#include <cstdint>
+#include <map>
+#include <string>
+#include <vector>
+
+// Signatures of the metre module's schedule functions.
+using VtMetre_RemplitTableauFn = std::int32_t(std::string file, std::vector<CZodEVIArticle*>* table, std::int32_t flag);
+using VtMetre_ExporterXmlFn = std::int32_t(std::string file, std::vector<CZodEVIArticle*>* table, std::int32_t flag);
+using VtMetre_EditerBordereauFn = std::int32_t(std::string file, std::vector<CZodEVIArticle*>* records,
+                                               std::vector<std::uint32_t>* actions, std::string label);
+
+// Change kinds the editor returns.
+enum : std::uint32_t { kEditDeleted = 1, kEditModified = 2, kEditAdded = 3 };
+
+// The code pattern of a quantity selector (0 to 12); empty outside.
+std::string QuantityPatternOfSelector(int selector);
+
+// Clears the store, then fills it from the file. On failure the store stays empty, even
+// when the metre module delivered part of the file first.
+bool Read(CZodEVIBdr& bdr);
+// Hands every article to the metre module, in schedule order.
+bool Write(CZodEVIBdr& bdr);
+// Opens the editor (on the article with that tree path, or the whole schedule) and
+// mirrors its changes in the store; writes the file again when an added article took a
+// neighbour's group key. False when the editor did not close normally.
+bool Edit(CZodEVIBdr& bdr, const std::string& treePath);
+
+// Unit price of the article counting the quantity; 0 and false when there is none. An
+// empty network name means RSX_GENERAL.
+bool GetPrice(const CZodEVIBdr& bdr, int selector, const std::string& item, double& price,
+              const std::string& networkName);
+// Network name -> price text of every updated network and of RSX_GENERAL ("*"); prices
+// are written in the shortest text that reads back equal.
+bool GetPricesPerNetwork(const CZodEVIBdr& bdr, int selector, const std::string& item,
+                         std::map<std::string, std::string>& prices);
+bool SetPrice(CZodEVIBdr& bdr, int selector, const std::string& item, double price, const std::string& networkName);
+// Opens the editor on the article counting the quantity, or says that none does. An
+// empty network name searches every group for selectors 2-5, 7 and 8.
+bool ShowPrice(CZodEVIBdr& bdr, int selector, const std::string& item, const std::string& networkName);

@@ -4,9 +4,9 @@ ASAN_BUILD ?= build/asan
 JOBS       ?= 2
 DEB_PACKAGES = cmake g++ clang lld make libgtest-dev libgmock-dev libbenchmark-dev \
                libpugixml-dev libxlsxwriter-dev libncurses-dev locales \
-               python3-ezdxf python3-openpyxl libdxflib-dev libedit-dev
+               python3-ezdxf python3-openpyxl libdxflib-dev libclang-rt-14-dev libedit-dev
 
-.PHONY: deps build test bench clean
+.PHONY: deps build test bench fuzz clean
 
 # Installs what is missing when run as root; otherwise only says what is missing.
 deps:
@@ -31,6 +31,18 @@ test: deps
 	cmake -S . -B $(ASAN_BUILD) -DCMAKE_BUILD_TYPE=Debug -DVEL_SANITIZE=ON
 	cmake --build $(ASAN_BUILD) -j$(JOBS)
 	cd $(ASAN_BUILD) && ctest --output-on-failure -j$(JOBS)
+	$(MAKE) fuzz
+
+# A short bounded run of the DXF reader's fuzz target (clang, libFuzzer).
+FUZZ_BUILD ?= build/fuzz
+FUZZ_SECONDS ?= 30
+fuzz: deps
+	cmake -S . -B $(FUZZ_BUILD) -DCMAKE_BUILD_TYPE=RelWithDebInfo -DVEL_FUZZ=ON \
+	  -DCMAKE_C_COMPILER=clang -DCMAKE_CXX_COMPILER=clang++
+	cmake --build $(FUZZ_BUILD) -j$(JOBS) --target fuzz_dxf_reader
+	mkdir -p $(FUZZ_BUILD)/corpus
+	$(FUZZ_BUILD)/bin/fuzz_dxf_reader -max_total_time=$(FUZZ_SECONDS) -max_len=32768 \
+	  -timeout=10 -rss_limit_mb=2048 $(FUZZ_BUILD)/corpus tests/data/dxf/fuzz tests/data/dxf
 
 bench: deps
 	cmake -S . -B build/bench -DCMAKE_BUILD_TYPE=Release -DVEL_BENCH=ON

@@ -1,0 +1,211 @@
+// The schedule file: every field round-trips, malformed files are refused with their
+// line and nothing delivered, and a write that fails leaves the file and its backup.
+#include "schedule_file.hpp"
+
+#include "../host/temp_dir.hpp"
+#include "text/text.hpp"
+
+#include <gtest/gtest.h>
+
+#include <cfloat>
+#include <climits>
+#include <cmath>
+#include <csignal>
+#include <cstring>
+#include <sys/resource.h>
+
+namespace {
+
+using metre::ArticleVector;
+
+// Every field set to something a careless writer would damage.
+CZodEVIArticle Tricky(int seed)
+{
+    CZodEVIArticle a;
+    const double reals[] = {12345.67, 1500000, DBL_MAX, -DBL_MIN, 5e-324, -0.0, 0.1, 1e-300, 19.6, 1.0 / 3, 2.5e17};
+    const int ints[] = {INT_MIN, INT_MAX, -1, 0, 7, 42};
+    const char* texts[] = {"Déblais « en masse » \"quotes\" & <balises>",
+                           "ligne 1\r\nligne 2\nfin\r",
+                           "  espaces au bord  ",
+                           "Voirie\\\\Terrassements\\\\Volumique\\\\GC-001 - Volume des déblais",
+                           "\ttab\t",
+                           "",
+                           "œuvre Œ ÿ € m² m³ 'apostrophe'"};
+    int r = seed, i = seed, t = seed;
+    for (const CZodEVIArticleField& field : ArticleFields()) {
+        switch (field.type) {
+        case CZodEVIArticleField::Type::Real:
+            a.*field.real = reals[r++ % std::size(reals)];
+            break;
+        case CZodEVIArticleField::Type::Int:
+            a.*field.integer = ints[i++ % std::size(ints)];
+            break;
+        case CZodEVIArticleField::Type::Text:
+            a.*field.text = texts[t++ % std::size(texts)];
+            break;
+        }
+    }
+    return a;
+}
+
+void ExpectSameFields(const CZodEVIArticle& expected, const CZodEVIArticle& actual)
+{
+    for (const CZodEVIArticleField& field : ArticleFields()) {
+        SCOPED_TRACE(field.name);
+        switch (field.type) {
+        case CZodEVIArticleField::Type::Real:
+            EXPECT_EQ(std::memcmp(&(expected.*field.real), &(actual.*field.real), sizeof(double)), 0)
+                << expected.*field.real << " became " << actual.*field.real;
+            break;
+        case CZodEVIArticleField::Type::Int:
+            EXPECT_EQ(expected.*field.integer, actual.*field.integer);
+            break;
+        case CZodEVIArticleField::Type::Text:
+            EXPECT_EQ(expected.*field.text, actual.*field.text);
+            break;
+        }
+    }
+}
+
+std::vector<const CZodEVIArticle*> Pointers(const std::vector<CZodEVIArticle>& articles)
+{
+    std::vector<const CZodEVIArticle*> out;
+    for (const CZodEVIArticle& a : articles)
+        out.push_back(&a);
+    return out;
+}
+
+TEST(ScheduleFile, EveryFieldRoundTrips)
+{
+    TempDir dir;
+    std::vector<CZodEVIArticle> articles;
+    for (int seed = 0; seed < 7; ++seed)
+        articles.push_back(Tricky(seed));
+    articles.push_back(CZodEVIArticle());
+    const std::string path = dir.File("VelaBordereau.xml");
+    ASSERT_TRUE(metre::WriteScheduleFile(path, Pointers(articles)));
+    ArticleVector read;
+    const metre::FileResult result = metre::ReadScheduleFile(path, read);
+    ASSERT_TRUE(result) << result.message;
+    ASSERT_EQ(read.size(), articles.size());
+    for (std::size_t i = 0; i < articles.size(); ++i) {
+        SCOPED_TRACE(i);
+        ExpectSameFields(articles[i], *read[i]);
+    }
+}
+
+TEST(ScheduleFile, RealsAreWrittenShortAndWithoutLocale)
+{
+    CZodEVIArticle a;
+    a.unitPrice = 12345.67;
+    a.metreReal1 = 1500000;
+    a.taxRate = 5.5;
+    std::setlocale(LC_NUMERIC, "fr_FR.UTF-8");
+    const std::string xml = metre::ScheduleToXml({&a});
+    std::setlocale(LC_NUMERIC, "C");
+    EXPECT_NE(xml.find("unitPrice=\"12345.67\""), std::string::npos) << xml;
+    EXPECT_NE(xml.find("metreReal1=\"1500000\""), std::string::npos);
+    EXPECT_NE(xml.find("taxRate=\"5.5\""), std::string::npos);
+    EXPECT_NE(xml.find("encoding=\"UTF-8\""), std::string::npos);
+}
+
+TEST(ScheduleFile, MalformedFilesAreRefusedWithTheirLine)
+{
+    struct Case {
+        const char* name;
+        const char* content; // null: no file
+        const char* expected;
+    } cases[] = {
+        {"missing", nullptr, "fichier introuvable"},
+        {"not xml", "<?xml version=\"1.0\"?>\n<bordereau>\n<article code=\"A\">\n</bordereau>\n", "ligne 4"},
+        {"text", "ceci n'est pas du XML\n", "aucun élément XML"},
+        {"other root", "<?xml version=\"1.0\"?>\n\n<devis/>\n", "ligne 3 : élément racine <bordereau> attendu, <devis>"},
+        {"bad real", "<bordereau>\n<article code=\"A\"/>\n<article unitPrice=\"12,5\"/>\n</bordereau>",
+         "ligne 3 : article 2, champ « unitPrice » : nombre attendu, « 12,5 » trouvé"},
+        {"bad int", "<bordereau>\n<article number=\"3000000000\"/>\n</bordereau>",
+         "ligne 2 : article 1, champ « number » : nombre entier attendu"},
+        {"unknown field", "<bordereau>\n<article prix=\"1\"/>\n</bordereau>", "ligne 2 : article 1, champ inconnu « prix »"},
+        {"twice", "<bordereau>\n<article code=\"A\" code=\"B\"/>\n</bordereau>", "champ « code » en double"},
+        {"stray element", "<bordereau>\n<article/>\n<ligne/>\n</bordereau>", "ligne 3 : élément <article> attendu, <ligne>"},
+        {"truncated", "<bordereau>\n<article code=\"A\"/>\n<article code=\"B\"", "ligne 3"},
+    };
+    TempDir dir;
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.name);
+        const std::string path = c.content ? dir.Write(std::string(c.name) + ".xml", c.content)
+                                           : dir.File("absent.xml");
+        ArticleVector out;
+        out.push_back(std::make_unique<CZodEVIArticle>());
+        const metre::FileResult result = metre::ReadScheduleFile(path, out);
+        EXPECT_FALSE(result);
+        EXPECT_NE(result.message.find(path), std::string::npos) << result.message;
+        EXPECT_NE(result.message.find(c.expected), std::string::npos) << result.message;
+        EXPECT_EQ(out.size(), 1u) << "a refused file delivers nothing";
+        if (c.content) {
+            EXPECT_EQ(dir.Read(std::string(c.name) + ".xml"), c.content);
+        }
+    }
+}
+
+TEST(ScheduleFile, WriteKeepsThePreviousVersionAsBackup)
+{
+    TempDir dir;
+    const std::string path = dir.File("b.xml");
+    CZodEVIArticle first, second;
+    first.code = "V1";
+    second.code = "V2";
+    ASSERT_TRUE(metre::WriteScheduleFile(path, {&first}));
+    EXPECT_FALSE(std::filesystem::exists(path + ".bak")) << "nothing to back up the first time";
+    ASSERT_TRUE(metre::WriteScheduleFile(path, {&second}));
+    ArticleVector now, backup;
+    ASSERT_TRUE(metre::ReadScheduleFile(path, now));
+    ASSERT_TRUE(metre::ReadScheduleFile(path + ".bak", backup));
+    EXPECT_EQ(now.at(0)->code, "V2");
+    EXPECT_EQ(backup.at(0)->code, "V1");
+}
+
+TEST(ScheduleFile, WriteThatFailsMidwayLeavesFileAndBackup)
+{
+    TempDir dir;
+    const std::string path = dir.File("b.xml");
+    CZodEVIArticle one;
+    one.code = "V1";
+    ASSERT_TRUE(metre::WriteScheduleFile(path, {&one}));
+    one.code = "V2";
+    ASSERT_TRUE(metre::WriteScheduleFile(path, {&one}));
+    const std::string file = dir.Read("b.xml"), backup = dir.Read("b.xml.bak");
+
+    std::vector<CZodEVIArticle> many(2000, Tricky(1));
+    // The file size limit makes the write fail after its first blocks, as a full disk does.
+    struct rlimit saved {};
+    ASSERT_EQ(getrlimit(RLIMIT_FSIZE, &saved), 0);
+    const auto previousHandler = std::signal(SIGXFSZ, SIG_IGN);
+    struct rlimit small = saved;
+    small.rlim_cur = 64 * 1024;
+    ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &small), 0);
+    const metre::FileResult result = metre::WriteScheduleFile(path, Pointers(many));
+    setrlimit(RLIMIT_FSIZE, &saved);
+    std::signal(SIGXFSZ, previousHandler);
+
+    EXPECT_FALSE(result);
+    EXPECT_NE(result.message.find("écriture interrompue"), std::string::npos) << result.message;
+    EXPECT_NE(result.message.find(path), std::string::npos);
+    EXPECT_EQ(dir.Read("b.xml"), file);
+    EXPECT_EQ(dir.Read("b.xml.bak"), backup);
+    std::size_t entries = 0;
+    for ([[maybe_unused]] const auto& entry : std::filesystem::directory_iterator(dir.path))
+        ++entries;
+    EXPECT_EQ(entries, 2u) << "no temporary file is left behind";
+}
+
+TEST(ScheduleFile, WriteIntoMissingFolderFailsCleanly)
+{
+    TempDir dir;
+    CZodEVIArticle a;
+    const metre::FileResult result = metre::WriteScheduleFile(dir.File("absent/b.xml"), {&a});
+    EXPECT_FALSE(result);
+    EXPECT_NE(result.message.find("absent/b.xml"), std::string::npos);
+    EXPECT_FALSE(std::filesystem::exists(dir.path / "absent"));
+}
+
+} // namespace

@@ -3,6 +3,7 @@
 
 #include "text/text.hpp"
 
+#include <array>
 #include <climits>
 #include <cmath>
 #include <cstring>
@@ -171,6 +172,21 @@ bool ScheduleEdit::SetField(const std::string& treePath, const std::string& fiel
     return true;
 }
 
+void ScheduleEdit::FillFromTreePath(CZodEVIArticle& article, bool code, bool designation, bool nature)
+{
+    const std::string& treePath = article.treePath;
+    const std::size_t last = treePath.rfind('\\');
+    const std::string leaf = last == std::string::npos ? treePath : treePath.substr(last + 1);
+    const std::size_t dash = leaf.find(" - ");
+    if (code)
+        article.code = dash == std::string::npos ? leaf : leaf.substr(0, dash);
+    if (designation)
+        article.designation = dash == std::string::npos ? leaf : leaf.substr(dash + 3);
+    for (int level = 1; nature && level <= 6; ++level)
+        if (treePath.find(NatureLevel(level) + std::string(kSeparator)) != std::string::npos)
+            article.nature = level;
+}
+
 bool ScheduleEdit::Add(const std::string& treePath, std::string& error)
 {
     if (Trim(treePath).empty()) {
@@ -186,14 +202,7 @@ bool ScheduleEdit::Add(const std::string& treePath, std::string& error)
     entry.article.metreInt4 = 0;
     entry.article.groupKey = "0";
     entry.treePathSet = true;
-    const std::size_t last = treePath.rfind('\\');
-    const std::string leaf = last == std::string::npos ? treePath : treePath.substr(last + 1);
-    const std::size_t dash = leaf.find(" - ");
-    entry.article.code = dash == std::string::npos ? leaf : leaf.substr(0, dash);
-    entry.article.designation = dash == std::string::npos ? leaf : leaf.substr(dash + 3);
-    for (int nature = 1; nature <= 6; ++nature)
-        if (treePath.find(NatureLevel(nature) + std::string(kSeparator)) != std::string::npos)
-            entry.article.nature = nature;
+    FillFromTreePath(entry.article, true, true, true);
     entries_.push_back(std::move(entry));
     return true;
 }
@@ -343,6 +352,8 @@ bool ParseScheduleTable(std::string_view text, const std::string& name, Schedule
     std::vector<bool> seen(original.size(), false);
     ScheduleEdit::Entry* block = nullptr;
     std::vector<int> newBlockLines;
+    // Which of code, designation and nature each new block gives itself.
+    std::vector<std::array<bool, 3>> newBlockGiven;
     int lineNumber = 0;
     std::size_t start = 0;
     while (start < text.size()) {
@@ -363,6 +374,7 @@ bool ParseScheduleTable(std::string_view text, const std::string& name, Schedule
                 entries.back().article.metreInt4 = 0;
                 entries.back().article.groupKey = "0";
                 newBlockLines.push_back(lineNumber);
+                newBlockGiven.push_back({false, false, false});
             } else {
                 unsigned long number = 0;
                 char tail = 0;
@@ -388,6 +400,12 @@ bool ParseScheduleTable(std::string_view text, const std::string& name, Schedule
         const CZodEVIArticleField* field = FieldNamed(fieldName);
         if (field == nullptr)
             return fail(lineNumber, FormatString("champ inconnu « %s »", fieldName.c_str()));
+        if (!block->original) {
+            auto& given = newBlockGiven.back();
+            given[0] = given[0] || field->text == &CZodEVIArticle::code;
+            given[1] = given[1] || field->text == &CZodEVIArticle::designation;
+            given[2] = given[2] || field->integer == &CZodEVIArticle::nature;
+        }
         std::string_view value = line.substr(equals + 1);
         if (!value.empty() && value.front() == ' ')
             value.remove_prefix(1);
@@ -404,9 +422,11 @@ bool ParseScheduleTable(std::string_view text, const std::string& name, Schedule
     for (ScheduleEdit::Entry& entry : entries) {
         if (entry.original)
             continue;
-        const int line = newBlockLines[newIndex++];
+        const int line = newBlockLines[newIndex];
+        const auto& given = newBlockGiven[newIndex++];
         if (!entry.treePathSet)
             return fail(line, "un nouvel article demande le champ treePath");
+        ScheduleEdit::FillFromTreePath(entry.article, !given[0], !given[1], !given[2]);
     }
     std::string problem;
     if (!edit.Validate(problem))

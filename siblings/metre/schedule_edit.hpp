@@ -52,6 +52,8 @@ public:
     std::vector<Entry>& Entries() { return entries_; }
     const ArticleVector& Original() const { return original_; }
     Entry* Find(const std::string& treePath);
+    // Code, designation and nature (each when asked) from the article's tree path.
+    static void FillFromTreePath(CZodEVIArticle& article, bool code, bool designation, bool nature);
     // Sets one field of an entry from its text; false when the text is no value of it.
     static bool SetEntryField(Entry& entry, const CZodEVIArticleField& field, const std::string& value);
 

@@ -128,6 +128,12 @@ bool Matches(const std::vector<Piece>& pieces, std::size_t p, std::string_view t
     return false;
 }
 
+// True when the key is the pattern between double quotes, placeholders filled.
+bool Fits(const std::vector<Piece>& pieces, std::string_view key)
+{
+    return key.size() >= 2 && key.front() == '"' && key.back() == '"' && Matches(pieces, 0, key.substr(1, key.size() - 2));
+}
+
 bool HasPlaceholder(const std::vector<Piece>& pieces)
 {
     for (const Piece& piece : pieces)
@@ -180,9 +186,7 @@ std::optional<std::string> FamilyCategory(const std::string& codePattern, const 
     if (!pieces || !HasPlaceholder(*pieces))
         return std::nullopt;
     for (const CZodEVIArticle* article : group) {
-        const std::string_view key = article->quantityKey;
-        if (key.size() < 2 || key.front() != '"' || key.back() != '"' ||
-            !Matches(*pieces, 0, key.substr(1, key.size() - 2)))
+        if (!Fits(*pieces, article->quantityKey))
             continue;
         auto category = CategoryOfSibling(*article);
         if (category && !category->empty())
@@ -281,8 +285,7 @@ bool Purge(CZodEVIBdr& bdr, const CZodEVIArtTemplate& tmpl, CZodEVIGroup& group,
         const std::string_view key = article->quantityKey;
         if (sampleLength && key.size() != *sampleLength)
             continue;
-        if (key.size() < 2 || key.front() != '"' || key.back() != '"' ||
-            !Matches(*pieces, 0, key.substr(1, key.size() - 2)))
+        if (!Fits(*pieces, key))
             continue;
         if (kept.count(FoldCase(key)) == 0)
             victims.push_back(article);
@@ -290,7 +293,7 @@ bool Purge(CZodEVIBdr& bdr, const CZodEVIArtTemplate& tmpl, CZodEVIGroup& group,
     return bdr.RemoveArticles(victims) != 0;
 }
 
-std::size_t SampleLength(const CZodEVIArtTemplate& tmpl, std::vector<PatternArg> zeros)
+std::size_t SampleLength(const CZodEVIArtTemplate& tmpl, const std::vector<PatternArg>& zeros)
 {
     return MakeQuantityKey(FormatPattern(tmpl.codePattern, zeros)).size();
 }
@@ -300,8 +303,7 @@ std::size_t SampleLength(const CZodEVIArtTemplate& tmpl, std::vector<PatternArg>
 bool KeyFitsPattern(std::string_view codePattern, std::string_view quantityKey)
 {
     const auto pieces = SplitPattern(codePattern);
-    return pieces && quantityKey.size() >= 2 && quantityKey.front() == '"' && quantityKey.back() == '"' &&
-           Matches(*pieces, 0, quantityKey.substr(1, quantityKey.size() - 2));
+    return pieces && Fits(*pieces, quantityKey);
 }
 
 bool InstantiateByName(CZodEVIBdr& bdr, int networkIndex, const std::string& networkName,

@@ -157,6 +157,16 @@ bool ProjectTables::HasProject(int projectKind, const std::string& project) cons
     return kind != tables_.end() && kind->second.count(project) != 0;
 }
 
+std::optional<int> ProjectTables::KindHolding(int projectKind, const std::string& project) const
+{
+    if (HasProject(projectKind, project))
+        return projectKind;
+    for (int kind : {1, 2, 4, 3})
+        if (HasProject(kind, project))
+            return kind;
+    return std::nullopt;
+}
+
 std::optional<double> ProjectTables::Quantity(int projectKind, const std::string& project, const std::string& key) const
 {
     const auto kind = tables_.find(projectKind);

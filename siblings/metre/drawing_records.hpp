@@ -27,6 +27,10 @@ public:
     // to case; nullopt when the project or the key is missing.
     std::optional<double> Quantity(int projectKind, const std::string& project, const std::string& key) const;
     bool HasProject(int projectKind, const std::string& project) const;
+    // The kind under which the project is found: the given one first, then the others
+    // (a line summing several projects carries the kind of only one of them); nullopt
+    // when no kind has it.
+    std::optional<int> KindHolding(int projectKind, const std::string& project) const;
 
     void Add(int projectKind, const std::string& project, QuantityList quantities);
 

@@ -52,7 +52,7 @@ std::string CodeOfTreePath(const std::string& treePath)
 std::vector<std::string> ProjectsOfLine(const CZodEVIAssocLine& line, const ProjectTables& projects)
 {
     // Names are joined with "," in sum mode, but a name may hold a comma itself.
-    if (IsPseudoProject(line.projects) || projects.HasProject(line.projectKind, line.projects))
+    if (IsPseudoProject(line.projects) || projects.KindHolding(line.projectKind, line.projects))
         return {line.projects};
     std::vector<std::string> names;
     std::size_t start = 0;
@@ -75,9 +75,10 @@ double LineQuantity(const CZodEVIAssocLine& line, const ProjectTables& projects,
             total += 1.0;
             continue;
         }
-        if (const auto quantity = projects.Quantity(line.projectKind, project, line.quantityKey))
+        const std::optional<int> kind = projects.KindHolding(line.projectKind, project);
+        if (const auto quantity = kind ? projects.Quantity(*kind, project, line.quantityKey) : std::nullopt)
             total += *quantity;
-        else if (!projects.HasProject(line.projectKind, project))
+        else if (!kind)
             warnings.push_back(FormatString("« %s » : projet « %s » absent du dessin, quantité 0.", line.label.c_str(),
                                             project.c_str()));
         else

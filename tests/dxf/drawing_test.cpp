@@ -258,6 +258,38 @@ TEST(Drawing, MalformedFilesAreRefusedWithFileLineAndExpectation)
     }
 }
 
+TEST(Drawing, ASeedLeftTooLowIsRaisedOnlyWhenSomethingIsWritten)
+{
+    const std::string text = Replace(Sound(), "$HANDSEED\n  5\nFF", "$HANDSEED\n  5\n2");
+    std::unique_ptr<AcDbDatabase> db;
+    std::string error;
+    ASSERT_TRUE(velReadDrawing(text, "graine.dxf", db, error)) << error;
+    EXPECT_EQ(Written(*db), text);
+    AcDbDictionary* nod = nullptr;
+    ASSERT_EQ(db->getNamedObjectsDictionary(nod, AcDb::kForWrite), Acad::eOk);
+    auto* record = new AcDbXrecord;
+    AcDbObjectId id;
+    ASSERT_EQ(nod->setAt("NOUVEAU", record, id), Acad::eOk);
+    record->close();
+    nod->close();
+    EXPECT_EQ(id.handle(), 0x21u);  // above the highest handle, 20
+    const std::string written = Written(*db);
+    EXPECT_NE(written.find("$HANDSEED\n  5\n22\n"), std::string::npos);
+}
+
+TEST(Drawing, DictionaryEntriesMayNameDictionariesOfAnySection)
+{
+    // A cycle through a dictionary filed among the entities is still a cycle.
+    const std::string text = Replace(Sound(), "  0\nLINE\n  5\n20\n  8\n0\n 10\n0.0\n1001\nACAD\n1000\ntexte\n",
+                                     "  0\nDICTIONARY\n  5\n20\n  3\nY\n350\nC\n");
+    const std::string looped = Replace(text, "  3\nA\n350\nD\n", "  3\nA\n350\nD\n  3\nZ\n350\n20\n");
+    std::unique_ptr<AcDbDatabase> db;
+    std::string error;
+    EXPECT_FALSE(velReadDrawing(looped, "boucle.dxf", db, error));
+    EXPECT_EQ(error, "« boucle.dxf », ligne 75 : il fallait une entrée qui ne remonte pas à un dictionnaire parent "
+                     "(« Z » ramène au dictionnaire de la ligne 47)");
+}
+
 TEST(Drawing, OpenAndSaveReportFileErrors)
 {
     std::unique_ptr<AcDbDatabase> db;

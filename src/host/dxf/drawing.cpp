@@ -481,7 +481,7 @@ bool DrawingFile::CheckDictionaries(std::string& error)
 {
     std::vector<std::size_t> dictionaries;
     for (std::size_t i = 0; i < records.size(); ++i)
-        if (records[i].section == Section::Objects && IsDictionaryType(records[i].type))
+        if (IsDictionaryType(records[i].type))
             dictionaries.push_back(i);
     // Every object the host needs at once is read now, so that a malformed one refuses
     // the file instead of going missing later.
@@ -808,7 +808,12 @@ std::vector<std::string> DrawingFile::ChangedHeaderVars() const
         changed.push_back("$CLAYER");
     const bool hasSeed = std::any_of(headerVars.begin(), headerVars.end(),
                                      [](const HeaderVar& v) { return v.name == "$HANDSEED"; });
-    if (nextHandle > handseed && (hasSeed || !addedIndex.empty()))
+    // A seed the file left too low is raised only when something is written anyway, so
+    // that a drawing saved without change stays byte for byte the same.
+    const bool anyChange = !changed.empty() || !addedIndex.empty() ||
+                           std::any_of(objects.begin(), objects.end(),
+                                       [](const auto& o) { return o && o->body().dirty; });
+    if (nextHandle > handseed && (hasSeed || !addedIndex.empty()) && anyChange)
         changed.push_back("$HANDSEED");
     return changed;
 }

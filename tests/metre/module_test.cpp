@@ -1,0 +1,133 @@
+// The metre module loaded into a host: the schedule read, written and edited through the
+// module's exchange, the currency, and an estimate listed afterwards.
+#include "schedule/schedule_exchange.hpp"
+
+#include "../host/temp_dir.hpp"
+#include "module/siblings.hpp"
+#include "velhost/documents.h"
+#include "velhost/profile.h"
+#include "velhost/rx.h"
+#include "velhost/ui.h"
+#include "zodevi/assoc_line.h"
+
+#include <gtest/gtest.h>
+
+#include <sstream>
+
+namespace {
+
+using VtMetre_AfficherAssocFn = std::int32_t(std::string name, std::vector<CZodEVIAssocLine*>* lines,
+                                             std::int32_t show, std::int32_t mode);
+
+class MetreModule : public ::testing::Test {
+protected:
+    void SetUp() override
+    {
+        saved = velHostSettings();
+        velHostSettings().profileDir = dir.path.string();
+        previousUI = velSetUI(&ui);
+        ASSERT_TRUE(acrxLoadModule(VEL_MODULE_DIR "/VelMetre15.arx", false));
+        ASSERT_TRUE(acrxServiceIsRegistered(kMetreService));
+        bdr.path = dir.File("VelaBordereau.xml");
+    }
+    void TearDown() override
+    {
+        acDocManager->closeAll();
+        velUnloadAllModules();
+        velSetUI(previousUI);
+        velHostSettings() = saved;
+    }
+    TempDir dir;
+    VelHostSettings saved;
+    std::istringstream script;
+    std::ostringstream output;
+    VelScriptedUI ui{script, output, "metre.scr"};
+    VelUserInterface* previousUI = nullptr;
+    CZodEVIBdr bdr;
+};
+
+TEST_F(MetreModule, ScheduleGoesThroughTheModuleFile)
+{
+    EXPECT_FALSE(Read(bdr));
+    EXPECT_NE(output.str().find("Bordereau « " + bdr.path + " » : fichier introuvable."), std::string::npos)
+        << output.str();
+    auto article = std::make_unique<CZodEVIArticle>();
+    article->code = "EU-001";
+    article->designation = "Tuyau « PVC »";
+    article->description = "Ligne 1\r\nLigne 2";
+    article->quantityKey = "\"RSX_TUY_LIN_3D_PVC 200\"";
+    article->groupKey = "PRJ_RES(EU1)";
+    article->treePath = "Réseaux\\\\EU1\\\\Linéaire\\\\EU-001 - Tuyau « PVC »";
+    article->unitPrice = 12345.67;
+    article->metreText7 = "champ du métré";
+    bdr.AddArticle(std::move(article));
+    ASSERT_TRUE(Write(bdr));
+
+    ASSERT_TRUE(Read(bdr));
+    const std::size_t withProjectWide = bdr.Articles().size();
+    EXPECT_GT(withProjectWide, 1u);
+    const CZodEVIArticle* back = bdr.FindByTreePath("réseaux\\\\eu1\\\\linéaire\\\\EU-001 - tuyau « pvc »").article;
+    ASSERT_NE(back, nullptr);
+    EXPECT_EQ(back->description, "Ligne 1\r\nLigne 2");
+    EXPECT_EQ(back->metreText7, "champ du métré");
+    double price = 0;
+    EXPECT_TRUE(GetPrice(bdr, 0, "PVC 200", price, "EU1"));
+    EXPECT_EQ(price, 12345.67);
+
+    ASSERT_TRUE(Write(bdr));
+    ASSERT_TRUE(Read(bdr));
+    EXPECT_EQ(bdr.Articles().size(), withProjectWide);
+}
+
+TEST_F(MetreModule, ScriptedEditorIsMirroredInTheStore)
+{
+    auto article = std::make_unique<CZodEVIArticle>();
+    article->code = "EU-001";
+    article->designation = "Tuyau";
+    article->groupKey = "PRJ_RES(EU1)";
+    article->treePath = "Réseaux\\\\EU1\\\\Linéaire\\\\EU-001 - Tuyau";
+    bdr.GroupOf("PRJ_RES(EU1)", true)->push_back(bdr.AddArticle(std::move(article)));
+    ASSERT_TRUE(Write(bdr));
+    script.str("ajouter Réseaux\\\\EU1\\\\Linéaire\\\\EU-002 - Tuyau fonte\n"
+               "champ unitPrice Réseaux\\\\EU1\\\\Linéaire\\\\EU-002 - Tuyau fonte\n"
+               "88\n"
+               "fin\n");
+    ASSERT_TRUE(Edit(bdr, ""));
+    const CZodEVIArticle* added = bdr.FindByTreePath("Réseaux\\\\EU1\\\\Linéaire\\\\EU-002 - Tuyau fonte").article;
+    ASSERT_NE(added, nullptr) << output.str();
+    EXPECT_EQ(added->unitPrice, 88);
+    EXPECT_EQ(added->groupKey, "PRJ_RES(EU1)") << "the neighbour's group key";
+    CZodEVIBdr reread;
+    reread.path = bdr.path;
+    ASSERT_TRUE(Read(reread));
+    EXPECT_EQ(reread.FindByTreePath(added->treePath).article->groupKey, "PRJ_RES(EU1)") << "written again";
+}
+
+TEST_F(MetreModule, CurrencyAndEstimates)
+{
+    std::string currency;
+    ASSERT_EQ(sibling::VtMetre_SymbMonetaire(&currency), 0);
+    EXPECT_EQ(currency, "€");
+    ASSERT_TRUE(velWritePrivateProfileString("Metre", "Monnaie", "CHF", dir.File("VelMetre.ini")));
+    ASSERT_EQ(sibling::VtMetre_SymbMonetaire(&currency), 0);
+    EXPECT_EQ(currency, "CHF");
+
+    acDocManager->createDocument(nullptr, dir.File("plan.dxf"));
+    CZodEVIAssocLine line;
+    line.label = "Essais";
+    line.lineKind = 5;
+    line.projects = "**Forfait";
+    line.treePath = "Divers\\\\DV-001 - Essais";
+    line.unitPrice = 250;
+    std::vector<CZodEVIAssocLine*> lines{&line};
+    EXPECT_EQ(CallMetre<VtMetre_AfficherAssocFn>("VtMetre_AfficherAssoc", std::string("Devis"), &lines, 1, 0), 0)
+        << output.str();
+    std::vector<std::string> names;
+    std::int32_t ignored = 0;
+    ASSERT_EQ(sibling::VtMetre_ListeDesMetres(&names, &ignored), 0);
+    EXPECT_EQ(names, std::vector<std::string>{"Devis"});
+    EXPECT_TRUE(std::filesystem::exists(dir.File("Devis.xlsx")));
+    EXPECT_NE(dir.Read("Devis.csv").find(";Total HT;;;;250,00;"), std::string::npos);
+}
+
+} // namespace

@@ -82,6 +82,9 @@ class AcApDocManager : public AcRxObject {
 
   void addReactor(AcApDocManagerReactor* reactor);
   void removeReactor(AcApDocManagerReactor* reactor);
+  // Host side: removes the reactors a module added (appId) and never removed, once its
+  // code is gone; answers how many.
+  std::size_t removeReactorsOf(void* appId);
 
   // Makes a module's resources current around its dialogs; pops answer false when the
   // stack is empty.
@@ -109,6 +112,7 @@ class AcApDocManager : public AcRxObject {
   std::vector<std::unique_ptr<AcApDocument>> documents_;
   AcApDocument* current_ = nullptr;
   std::vector<AcApDocManagerReactor*> reactors_;
+  std::vector<void*> reactorOwners_;  // the module that added each reactor
   std::vector<void*> resources_;
   int untitledCounter_ = 0;
   AcAp::DocLockMode lockMode_ = AcAp::kNotLocked;

@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <filesystem>
 
+#include "host_internal.h"
 #include "text/text.hpp"
 
 AcApDocument::AcApDocument(std::unique_ptr<AcDbDatabase> database, std::string fileName)
@@ -51,11 +52,29 @@ AcApDocumentIterator* AcApDocManager::newAcApDocumentIterator() const {
 }
 
 void AcApDocManager::addReactor(AcApDocManagerReactor* reactor) {
-  if (reactor != nullptr && std::find(reactors_.begin(), reactors_.end(), reactor) == reactors_.end())
+  if (reactor != nullptr && std::find(reactors_.begin(), reactors_.end(), reactor) == reactors_.end()) {
     reactors_.push_back(reactor);
+    reactorOwners_.push_back(velCurrentApp());
+  }
 }
 
-void AcApDocManager::removeReactor(AcApDocManagerReactor* reactor) { std::erase(reactors_, reactor); }
+void AcApDocManager::removeReactor(AcApDocManagerReactor* reactor) {
+  auto it = std::find(reactors_.begin(), reactors_.end(), reactor);
+  if (it == reactors_.end()) return;
+  reactorOwners_.erase(reactorOwners_.begin() + (it - reactors_.begin()));
+  reactors_.erase(it);
+}
+
+std::size_t AcApDocManager::removeReactorsOf(void* appId) {
+  std::size_t removed = 0;
+  for (std::size_t i = reactors_.size(); i-- > 0;) {
+    if (appId == nullptr || reactorOwners_[i] != appId) continue;
+    reactors_.erase(reactors_.begin() + static_cast<std::ptrdiff_t>(i));
+    reactorOwners_.erase(reactorOwners_.begin() + static_cast<std::ptrdiff_t>(i));
+    ++removed;
+  }
+  return removed;
+}
 
 namespace {
 

@@ -15,6 +15,7 @@
 #include "host_internal.h"
 #include "text/text.hpp"
 #include "velhost/commands.h"
+#include "velhost/documents.h"
 #include "velhost/editor.h"
 #include "velhost/ui.h"
 
@@ -109,7 +110,24 @@ void RemoveRecord(LoadedModule* module) {
                 modules.end());
 }
 
+// Takes the module's registrations out, closes the library (its static objects go), then
+// drops the document reactors it left behind, and forgets it.
+void CloseModule(LoadedModule* module, bool warn) {
+  ForgetModule(module, warn);
+  if (module->handle != nullptr) {
+    VelAppScope scope(module);
+    dlclose(module->handle);
+    module->handle = nullptr;
+  }
+  const std::size_t reactors = acDocManagerPtr()->removeReactorsOf(module);
+  if (warn && reactors > 0)
+    acutPrintf("Le module %s n'a pas retiré %zu réacteur(s) de documents ; ils sont retirés.\n",
+               module->path.c_str(), reactors);
+  RemoveRecord(module);
+}
+
 AcRx::AppRetCode Send(LoadedModule* module, AcRx::AppMsgCode message) {
+  if (module->entry == nullptr) return AcRx::kRetOK;
   VelAppScope scope(module);
   return module->entry(message, module);
 }
@@ -236,24 +254,13 @@ bool AcRxDynamicLinker::loadModule(const char* fileName, bool printit, bool asCm
     acutPrintf("Impossible de trouver le module %s.\n", fileName);
     return false;
   }
+  // Also true for a module asking for itself while its static objects are built.
   if (FindByName(path) != nullptr) return true;
 
-  void* handle = dlopen(path.c_str(), RTLD_NOW | RTLD_LOCAL);
-  if (handle == nullptr) {
-    const char* why = dlerror();
-    acutPrintf("Impossible d'ouvrir le module %s : %s\n", path.c_str(), why ? why : "?");
-    return false;
-  }
-  auto entry = reinterpret_cast<AcRxEntryPointFn>(dlsym(handle, "acrxEntryPoint"));
-  if (entry == nullptr) {
-    dlclose(handle);
-    acutPrintf("Le module %s n'exporte pas de point d'entrée acrxEntryPoint.\n", path.c_str());
-    return false;
-  }
+  // The record exists before dlopen: what the module's static objects register while it
+  // opens (a document reactor, a nested load) is known to be the module's.
   auto record = std::make_unique<LoadedModule>();
   record->path = path;
-  record->handle = handle;
-  record->entry = entry;
   LoadedModule* module = record.get();
   State().modules.push_back(std::move(record));
 
@@ -263,13 +270,24 @@ bool AcRxDynamicLinker::loadModule(const char* fileName, bool printit, bool asCm
     LoadedModule* module;
     bool armed = true;
     ~Undo() {
-      if (!armed) return;
-      void* h = module->handle;
-      ForgetModule(module, false);
-      RemoveRecord(module);
-      dlclose(h);
+      if (armed) CloseModule(module, false);
     }
   } undo{module};
+
+  {
+    VelAppScope scope(module);
+    module->handle = dlopen(path.c_str(), RTLD_NOW | RTLD_LOCAL);
+  }
+  if (module->handle == nullptr) {
+    const char* why = dlerror();
+    acutPrintf("Impossible d'ouvrir le module %s : %s\n", path.c_str(), why ? why : "?");
+    return false;
+  }
+  module->entry = reinterpret_cast<AcRxEntryPointFn>(dlsym(module->handle, "acrxEntryPoint"));
+  if (module->entry == nullptr) {
+    acutPrintf("Le module %s n'exporte pas de point d'entrée acrxEntryPoint.\n", path.c_str());
+    return false;
+  }
 
   AcRx::AppRetCode answer = AcRx::kRetError;
   try {
@@ -295,6 +313,12 @@ bool AcRxDynamicLinker::unloadModule(const char* fileName, bool asCmd, bool forc
     return false;
   }
   if (module->unloading) return false;
+  // Its code is on the stack: closing it now would pull the ground from under it.
+  const auto& running = State().running;
+  if (std::find(running.begin(), running.end(), module) != running.end()) {
+    acutPrintf("Le module %s est en cours d'exécution et ne peut pas être déchargé.\n", module->path.c_str());
+    return false;
+  }
   if (module->locked && !force) {
     acutPrintf("Le module %s est verrouillé et ne peut pas être déchargé.\n", module->path.c_str());
     return false;
@@ -312,10 +336,7 @@ bool AcRxDynamicLinker::unloadModule(const char* fileName, bool asCmd, bool forc
     return false;
   }
   const std::string path = module->path;
-  void* handle = module->handle;
-  ForgetModule(module, true);
-  RemoveRecord(module);
-  dlclose(handle);
+  CloseModule(module, true);
   if (asCmd) acutPrintf("Module %s déchargé.\n", path.c_str());
   return true;
 }

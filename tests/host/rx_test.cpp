@@ -8,6 +8,7 @@
 
 #include "host_fixture.hpp"
 #include "velhost/commands.h"
+#include "velhost/documents.h"
 #include "velhost/profile.h"
 
 namespace {
@@ -96,6 +97,12 @@ TEST_F(DynamicLinker, UnloadGoesInReverseOrderAndCleansUp)
     EXPECT_LT(sloppy, good);
     EXPECT_NE(out.find("n'a pas retiré le service VelTestSloppyService"), std::string::npos);
     EXPECT_NE(out.find("n'a pas retiré le groupe de commandes VELTEST_SLOPPY"), std::string::npos);
+    EXPECT_NE(out.find("n'a pas retiré 1 réacteur(s) de documents"), std::string::npos);
+    // Its reactor is no longer told of anything.
+    session.ClearOutput();
+    acDocManagerPtr()->createDocument(nullptr, "");
+    acDocManagerPtr()->closeAll();
+    EXPECT_EQ(session.Output().find("sloppy: document"), std::string::npos);
     EXPECT_FALSE(acrxServiceIsRegistered("VelTestSloppyService"));
     EXPECT_EQ(acedRegCmds()->lookupCmd("VelTestHello"), nullptr);
     EXPECT_TRUE(velLoadedModules().empty());

@@ -1,6 +1,7 @@
-// Test module: stays locked and leaves its service and commands registered at unload,
-// so that the host must clean up after it.
+// Test module: stays locked and leaves its service, commands and document reactor
+// registered at unload, so that the host must clean up after it.
 #include "velhost/commands.h"
+#include "velhost/documents.h"
 #include "velhost/editor.h"
 #include "velhost/rx.h"
 
@@ -9,6 +10,13 @@ namespace {
 class SloppyService : public AcRxService {};
 
 SloppyService g_service;
+
+// Subscribes while the library opens and never unsubscribes.
+struct Listener : AcApDocManagerReactor {
+    Listener() { acDocManagerPtr()->addReactor(this); }
+    void documentCreated(AcApDocument*) override { acutPrintf("sloppy: document\n"); }
+};
+Listener g_listener;
 
 void HelloCommand()
 {

@@ -290,6 +290,29 @@ TEST(Drawing, DictionaryEntriesMayNameDictionariesOfAnySection)
                      "(« Z » ramène au dictionnaire de la ligne 47)");
 }
 
+TEST(Drawing, HandlesUseAll64Bits)
+{
+    const std::string text = Replace(Sound(), "  0\nLINE\n  5\n20\n", "  0\nLINE\n  5\nfffffffffffffffe\n");
+    std::unique_ptr<AcDbDatabase> db;
+    std::string error;
+    ASSERT_TRUE(velReadDrawing(text, "grand.dxf", db, error)) << error;
+    AcDbObject* line = nullptr;
+    ASSERT_EQ(db->openObject(line, db->idFromHandle(0xFFFFFFFFFFFFFFFEULL), AcDb::kForRead), Acad::eOk);
+    EXPECT_EQ(line->dxfName(), "LINE");
+    line->close();
+    AcDbDictionary* nod = nullptr;
+    ASSERT_EQ(db->getNamedObjectsDictionary(nod, AcDb::kForWrite), Acad::eOk);
+    AcDbObjectId id;
+    auto* last = new AcDbXrecord;
+    ASSERT_EQ(nod->setAt("DERNIER", last, id), Acad::eOk);
+    EXPECT_EQ(id.handle(), 0xFFFFFFFFFFFFFFFFULL);
+    auto* tooMany = new AcDbXrecord;
+    EXPECT_EQ(nod->setAt("DE TROP", tooMany, id), Acad::eNotApplicable);
+    delete tooMany;
+    last->close();
+    nod->close();
+}
+
 TEST(Drawing, OpenAndSaveReportFileErrors)
 {
     std::unique_ptr<AcDbDatabase> db;

@@ -281,7 +281,7 @@ bool DrawingFile::Scan(std::string& error)
             }
             if (!handleDone && (t.code == 5 || (t.code == 105 && isDimstyle))) {
                 const auto h = ParseHandle(t.value);
-                if (!h || *h == 0 || (*h & kSyntheticHandle)) {
+                if (!h || *h == 0) {
                     error = Fail(t.line + 1, "un identifiant hexadécimal non nul");
                     return false;
                 }
@@ -473,7 +473,8 @@ bool DrawingFile::IndexHandles(std::string& error)
                                               FormatHandle(b.handle).c_str(), a.line));
             return false;
         }
-    nextHandle = std::max(handseed, maxHandle + 1);
+    // maxHandle + 1 wraps to 0 when the file used the last handle: nothing can be added.
+    nextHandle = maxHandle == UINT64_MAX ? 0 : std::max(handseed, maxHandle + 1);
     return true;
 }
 
@@ -576,20 +577,29 @@ bool DrawingFile::Read(std::unique_ptr<Source> src, const std::string& name, std
 
 std::size_t DrawingFile::FindRecord(std::uint64_t handle) const
 {
-    if (handle & kSyntheticHandle) {
-        const std::uint64_t i = handle & ~kSyntheticHandle;
-        return i < records.size() && records[i].handle == 0 ? static_cast<std::size_t>(i) : SIZE_MAX;
-    }
     const auto it = std::lower_bound(index.begin(), index.end(), std::pair<std::uint64_t, std::uint32_t>{handle, 0});
     if (it != index.end() && it->first == handle)
         return it->second;
     const auto added = addedIndex.find(handle);
-    return added == addedIndex.end() ? SIZE_MAX : added->second;
+    if (added != addedIndex.end())
+        return added->second;
+    const auto madeUp = madeUpIndex.find(handle);
+    return madeUp == madeUpIndex.end() ? SIZE_MAX : madeUp->second;
 }
 
-std::uint64_t DrawingFile::HandleOf(std::size_t record) const
+std::uint64_t DrawingFile::HandleOf(std::size_t record)
 {
-    return records[record].handle != 0 ? records[record].handle : (kSyntheticHandle | record);
+    if (records[record].handle != 0)
+        return records[record].handle;
+    const auto known = madeUpHandles.find(record);
+    if (known != madeUpHandles.end())
+        return known->second;
+    if (nextHandle == 0)
+        return 0;
+    const std::uint64_t handle = nextHandle++;
+    madeUpHandles[record] = handle;
+    madeUpIndex[handle] = record;
+    return handle;
 }
 
 AcDbObject* DrawingFile::ObjectAt(std::size_t record, ParseError* failure)
@@ -633,13 +643,14 @@ bool DrawingFile::AddRecord(std::unique_ptr<AcDbObject> object, std::size_t befo
     rec.section = section;
     rec.line = 0;
     const std::size_t record = records.size();
+    if (nextHandle == 0)
+        return false;
     if (withHandle) {
         rec.handle = nextHandle++;
         addedIndex[rec.handle] = record;
     }
     body.database = database;
     body.record = record;
-    body.handle = rec.handle != 0 ? rec.handle : (kSyntheticHandle | record);
     body.owner = owner;
     body.dirty = true;
     std::vector<Tag> head;
@@ -658,6 +669,7 @@ bool DrawingFile::AddRecord(std::unique_ptr<AcDbObject> object, std::size_t befo
     records.push_back(rec);
     objects.push_back(std::move(object));
     records.back().type = objects.back()->body().type;
+    objects.back()->body().handle = HandleOf(record);
     insertions[before].push_back(record);
     modified = true;
     return true;
@@ -667,6 +679,10 @@ bool DrawingFile::AddObject(AcDbObject* object, std::uint64_t owner, std::string
 {
     if (objectsEnd == SIZE_MAX) {
         error = FormatString("un dessin %s ne peut pas contenir d'objets non graphiques", acadver.c_str());
+        return false;
+    }
+    if (nextHandle == 0) {
+        error = "le dessin n'a plus d'identifiant libre";
         return false;
     }
     return AddRecord(std::unique_ptr<AcDbObject>(object), objectsEnd, Section::Objects, owner, true);
@@ -729,7 +745,10 @@ bool DrawingFile::AddLayer(const std::string& name, std::size_t& record, std::st
     body.tags.push_back({6, 0, r12 ? "CONTINUOUS" : "Continuous"});
     body.entryPos = body.tags.size();
     record = records.size();
-    AddRecord(std::move(object), end->second, Section::Tables, tableHandles["LAYER"], !r12);
+    if (!AddRecord(std::move(object), end->second, Section::Tables, tableHandles["LAYER"], !r12)) {
+        error = "le dessin n'a plus d'identifiant libre";
+        return false;
+    }
     layers.push_back(record);
     return true;
 }
@@ -748,7 +767,10 @@ bool DrawingFile::AddApp(const std::string& name, std::string& error)
     body.tags.push_back({70, 0, "0"});
     body.entryPos = body.tags.size();
     const std::size_t record = records.size();
-    AddRecord(std::move(object), end->second, Section::Tables, tableHandles["APPID"], !r12);
+    if (!AddRecord(std::move(object), end->second, Section::Tables, tableHandles["APPID"], !r12)) {
+        error = "le dessin n'a plus d'identifiant libre";
+        return false;
+    }
     apps.push_back(record);
     return true;
 }

@@ -71,9 +71,6 @@ struct HeaderVar {
 
 class Writer;
 
-// Handles of records without one in the file (R12) are made up with this bit set; they
-// are never written.
-constexpr std::uint64_t kSyntheticHandle = 1ULL << 63;
 
 class DrawingFile {
 public:
@@ -95,7 +92,9 @@ public:
     AcDbObject* ObjectAt(std::size_t record, ParseError* failure = nullptr);
     // Record of a handle (or made-up handle); SIZE_MAX when unknown.
     std::size_t FindRecord(std::uint64_t handle) const;
-    std::uint64_t HandleOf(std::size_t record) const;
+    // Handle of a record; a record without one in the file (R12) is given one above every
+    // handle of the file when first asked, which is never written. 0 when none is left.
+    std::uint64_t HandleOf(std::size_t record);
     // Adds a new object (table record, or object of the OBJECTS section); gives it a
     // handle and writes its owner. False when the drawing cannot hold it (R12 objects).
     bool AddObject(AcDbObject* object, std::uint64_t owner, std::string& error);
@@ -117,13 +116,15 @@ public:
     Settings settings;
     Settings fileSettings;          // as read, to know what changed
     std::uint64_t handseed = 1;     // as read
-    std::uint64_t nextHandle = 1;   // first handle not used yet
+    std::uint64_t nextHandle = 1;   // first handle not used yet; 0 when all are taken
 
     std::vector<Record> records;
     std::size_t sourceCount = 0;    // records read from the file; added ones follow
     std::vector<std::unique_ptr<AcDbObject>> objects;  // parallel to records, filled on use
     std::vector<std::pair<std::uint64_t, std::uint32_t>> index;  // sorted (handle, record)
     std::map<std::uint64_t, std::size_t> addedIndex;             // handles of added records
+    std::map<std::uint64_t, std::size_t> madeUpIndex;            // handles given to handle-less records
+    std::map<std::size_t, std::uint64_t> madeUpHandles;
 
     std::size_t headerRecord = SIZE_MAX;
     std::vector<HeaderVar> headerVars;

@@ -32,6 +32,7 @@ struct Options {
   std::string modulesDir;
   std::string profileDir;
   std::string drawing;
+  bool help = false;
 };
 
 bool ParseArguments(int argc, char** argv, Options& options, std::string& error) {
@@ -55,6 +56,8 @@ bool ParseArguments(int argc, char** argv, Options& options, std::string& error)
       if (!value(options.modulesDir)) return false;
     } else if (arg == "--profile") {
       if (!value(options.profileDir)) return false;
+    } else if (arg == "--help" || arg == "-h") {
+      options.help = true;
     } else if (arg.size() > 1 && arg.front() == '-') {
       error = FormatString("option inconnue %s.", arg.c_str());
       return false;
@@ -88,6 +91,11 @@ int main(int argc, char** argv) {
     return 2;
   }
 
+  if (options.help) {
+    std::fputs(kUsage, stdout);
+    return 0;
+  }
+
   VelHostSettings& settings = velHostSettings();
   settings.modulesDir = fs::absolute(options.modulesDir.empty() ? DefaultModulesDir() : options.modulesDir).string();
   if (!options.profileDir.empty()) {
@@ -97,6 +105,8 @@ int main(int argc, char** argv) {
 
   std::ifstream scriptFile;
   std::unique_ptr<VelUserInterface> ui;
+  VelTerminalUI* terminal = nullptr;
+  const std::string historyFile = (fs::path(settings.profileDir) / "historique").string();
   if (!options.script.empty()) {
     scriptFile.open(options.script, std::ios::binary);
     if (!scriptFile) {
@@ -105,7 +115,9 @@ int main(int argc, char** argv) {
     }
     ui = std::make_unique<VelScriptedUI>(scriptFile, std::cout, options.script);
   } else if (isatty(STDIN_FILENO)) {
-    ui = std::make_unique<VelTerminalUI>(std::cin, std::cout, true);
+    terminal = new VelTerminalUI(std::cin, std::cout, true);
+    ui.reset(terminal);
+    terminal->loadHistory(historyFile);
   } else {
     ui = std::make_unique<VelScriptedUI>(std::cin, std::cout, "<entrée standard>");
   }
@@ -144,6 +156,12 @@ int main(int argc, char** argv) {
     }
   }
   status = shell.run();
+  if (terminal != nullptr) {
+    std::error_code ec;
+    fs::create_directories(settings.profileDir, ec);
+    if (!terminal->saveHistory(historyFile))
+      std::fprintf(stderr, "velhost : impossible d'écrire l'historique %s.\n", historyFile.c_str());
+  }
   velSetUI(nullptr);
   return status;
 }

@@ -263,7 +263,10 @@ int VelShell::run() {
   for (;;) {
     std::optional<VelInputLine> line = ui.readLine("\nCommande: ");
     if (!line) {
-      if (ui.inputEnded()) break;
+      if (ui.inputEnded()) {
+        if (script == nullptr) acutPrintf("\n");
+        break;
+      }
       acutPrintf("*Annulé*\n");
       continue;
     }
@@ -288,6 +291,10 @@ int VelShell::run() {
 
 void VelShell::shutdown() {
   std::string ignored;
-  for (AcApDocument* d : OpenDocuments()) CloseDocument(d, false, ignored);
+  for (AcApDocument* d : OpenDocuments()) {
+    if (d->database()->isModified())
+      acutPrintf("Les modifications de %s ne sont pas enregistrées.\n", d->docTitle().c_str());
+    CloseDocument(d, false, ignored);
+  }
   velUnloadAllModules();
 }

@@ -18,7 +18,8 @@ class VelShell {
   int run();
   // Opens a drawing (a new empty one for ""), as the OPEN command does.
   bool openDrawing(const std::string& path, std::string& error);
-  // Closes every drawing without saving, then unloads every module, last loaded first.
+  // Closes every drawing without saving (saying which had changes), then unloads every
+  // module, the last loaded first.
   void shutdown();
 };
 

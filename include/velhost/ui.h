@@ -92,6 +92,9 @@ class VelTerminalUI : public VelUserInterface {
   void print(const std::string& text) override;
   int messageBox(const VelMessageBox& box) override;
   bool isScripted() const override { return false; }
+  // The line history of earlier sessions (line editing only); a missing file is no error.
+  void loadHistory(const std::string& fileName);
+  bool saveHistory(const std::string& fileName) const;
 
  protected:
   std::optional<VelInputLine> readRawLine(const std::string& prompt) override;

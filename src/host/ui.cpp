@@ -115,6 +115,14 @@ std::optional<VelInputLine> VelTerminalUI::readRawLine(const std::string& prompt
   return VelInputLine{text, 0};
 }
 
+void VelTerminalUI::loadHistory(const std::string& fileName) {
+  if (lineEditing_) read_history(fileName.c_str());
+}
+
+bool VelTerminalUI::saveHistory(const std::string& fileName) const {
+  return !lineEditing_ || write_history(fileName.c_str()) == 0;
+}
+
 int VelTerminalUI::messageBox(const VelMessageBox& box) {
   print(velMessageBoxTranscript(box));
   const std::vector<int> buttons = velMessageBoxButtons(box.style);

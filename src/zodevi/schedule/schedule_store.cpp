@@ -80,6 +80,12 @@ void CZodEVIBdr::Clear()
 
 int CZodEVIBdr::NextFreeNumber() const
 {
+    // Usually every number is below the counter: one scan without allocation tells.
+    bool anyAtOrAbove = false;
+    for (const auto& article : articles)
+        anyAtOrAbove = anyAtOrAbove || article->number >= nextNumber;
+    if (!anyAtOrAbove)
+        return nextNumber;
     std::unordered_set<int> taken;
     taken.reserve(articles.size());
     for (const auto& article : articles)

@@ -1,5 +1,5 @@
 // The growable value array used for depth bounds, thicknesses and kind lists.
-#include "schedule/value_array.hpp"
+#include "zodevi/value_array.h"
 
 #include <gtest/gtest.h>
 

@@ -3,7 +3,7 @@
 #pragma once
 
 #include "schedule/schedule_store.hpp"
-#include "schedule/value_array.hpp"
+#include "zodevi/value_array.h"
 
 // One volume and one surface article per stripping thickness (metres); true when an
 // article was created or removed.

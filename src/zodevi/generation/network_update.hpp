@@ -4,7 +4,7 @@
 #pragma once
 
 #include "schedule/schedule_store.hpp"
-#include "schedule/value_array.hpp"
+#include "zodevi/value_array.h"
 
 #include <string>
 #include <vector>

@@ -1,9 +1,10 @@
 // Small growable array of plain values (32-bit integers or 8-byte reals) that callers
-// hand to the updates: depth bounds, thicknesses, class limits, lists of kinds.
+// hand to the service functions: depth bounds, thicknesses, class limits, lists of kinds.
 #pragma once
 
 #include <algorithm>
 #include <cstddef>
+#include <initializer_list>
 #include <type_traits>
 
 template <typename T>

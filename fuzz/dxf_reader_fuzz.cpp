@@ -2,6 +2,7 @@
 // that reads is walked as the module walks it, written back unchanged byte for byte,
 // changed, written and read again.
 #include <cstdint>
+#include <cstdio>
 #include <cstdlib>
 #include <string>
 
@@ -29,7 +30,7 @@ void Walk(AcDbDatabase& db, AcDbObjectId id, int depth)
 
 [[noreturn]] void Fault(const char* what)
 {
-    __builtin_printf("%s\n", what);
+    std::fprintf(stderr, "%s\n", what);
     std::abort();
 }
 

@@ -549,8 +549,8 @@ std::size_t AcDbDatabase::objectCount() const
 {
     std::size_t n = 0;
     for (const auto& r : file_->records)
-        if (r.handle != 0 || (r.section != vel::dxf::Section::None && r.type != "SECTION" && r.type != "ENDSEC" &&
-                              r.type != "TABLE" && r.type != "ENDTAB" && r.type != "CLASS"))
+        if (r.type != "SECTION" && r.type != "ENDSEC" && r.type != "TABLE" && r.type != "ENDTAB" &&
+            r.type != "CLASS" && r.type != "EOF")
             ++n;
     return n;
 }

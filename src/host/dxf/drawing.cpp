@@ -498,7 +498,7 @@ bool DrawingFile::CheckDictionaries(std::string& error)
     }
     for (std::size_t i : dictionaries)
         for (const auto& e : objects[i]->body().entries)
-            if (e.handle == 0 || FindRecord(e.handle) == SIZE_MAX) {
+            if (e.handle == 0 || FindFileRecord(e.handle) == SIZE_MAX) {
                 error = Fail(e.line, FormatString("une entrée vers un objet du dessin (l'identifiant %s de « %s » "
                                                   "n'existe pas)",
                                                   FormatHandle(e.handle).c_str(), e.key.c_str()));
@@ -524,7 +524,7 @@ bool DrawingFile::CheckDictionaries(std::string& error)
                 continue;
             }
             const DictEntry& e = entries[f.next++];
-            const std::size_t child = FindRecord(e.handle);
+            const std::size_t child = FindFileRecord(e.handle);
             if (!IsDictionaryType(records[child].type))
                 continue;
             if (state[child] == 1) {
@@ -575,11 +575,16 @@ bool DrawingFile::Read(std::unique_ptr<Source> src, const std::string& name, std
     return true;
 }
 
-std::size_t DrawingFile::FindRecord(std::uint64_t handle) const
+std::size_t DrawingFile::FindFileRecord(std::uint64_t handle) const
 {
     const auto it = std::lower_bound(index.begin(), index.end(), std::pair<std::uint64_t, std::uint32_t>{handle, 0});
-    if (it != index.end() && it->first == handle)
-        return it->second;
+    return it != index.end() && it->first == handle ? it->second : SIZE_MAX;
+}
+
+std::size_t DrawingFile::FindRecord(std::uint64_t handle) const
+{
+    if (const std::size_t found = FindFileRecord(handle); found != SIZE_MAX)
+        return found;
     const auto added = addedIndex.find(handle);
     if (added != addedIndex.end())
         return added->second;
@@ -842,7 +847,6 @@ std::vector<std::string> DrawingFile::ChangedHeaderVars() const
 
 void DrawingFile::WriteHeader(Writer& w, const std::vector<std::string>& changed) const
 {
-    const std::string_view buf = source->view();
     std::vector<bool> written(changed.size(), false);
     auto slot = [&](std::string_view name) -> int {
         for (std::size_t k = 0; k < changed.size(); ++k)
@@ -881,7 +885,6 @@ void DrawingFile::WriteHeader(Writer& w, const std::vector<std::string>& changed
         if (!written[k])
             newVar(changed[k]);
     w.Raw(headerVars.empty() ? rec.end : headerVars.back().end, rec.end);
-    (void)buf;
 }
 
 bool DrawingFile::Write(const std::function<bool(std::string_view)>& sink, std::string& error)
@@ -890,9 +893,7 @@ bool DrawingFile::Write(const std::function<bool(std::string_view)>& sink, std::
     Writer w(buf, sink);
     const std::vector<std::string> changed = ChangedHeaderVars();
     const bool header = !changed.empty();
-    if (header && headerRecord == SIZE_MAX && sourceCount > 0)
-        w.Raw(0, records[0].begin);
-    else if (sourceCount > 0)
+    if (sourceCount > 0)
         w.Raw(0, records[0].begin);
     if (header && headerRecord == SIZE_MAX)
         WriteHeader(w, changed);

@@ -92,6 +92,8 @@ public:
     AcDbObject* ObjectAt(std::size_t record, ParseError* failure = nullptr);
     // Record of a handle (or made-up handle); SIZE_MAX when unknown.
     std::size_t FindRecord(std::uint64_t handle) const;
+    // Same, among the handles written in the file only.
+    std::size_t FindFileRecord(std::uint64_t handle) const;
     // Handle of a record; a record without one in the file (R12) is given one above every
     // handle of the file when first asked, which is never written. 0 when none is left.
     std::uint64_t HandleOf(std::size_t record);

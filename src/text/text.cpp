@@ -158,21 +158,44 @@ std::string FormatPattern(std::string_view pattern, const std::vector<PatternArg
             i += 2;
             continue;
         }
-        // %[flags][width][.precision]conversion, with small bounded numbers only.
+        // %[flags][width][.precision]conversion, with small bounded numbers only; a "*"
+        // width or precision takes the next argument, bounded as well.
         std::size_t j = i + 1;
+        std::size_t argIndex = next;
+        std::string spec = "%";
+        auto takeStar = [&](int limit) {
+            long long v = 0;
+            if (argIndex < args.size()) {
+                const PatternArg& a = args[argIndex];
+                v = a.kind == PatternArg::Kind::Int ? a.integer
+                  : a.kind == PatternArg::Kind::Real ? static_cast<long long>(a.real)
+                                                     : ParseInt(a.text).value_or(0);
+            }
+            ++argIndex;
+            spec += std::to_string(std::clamp<long long>(v, 0, limit));
+            ++j;
+        };
         while (j < pattern.size() && std::string_view("-+ #0").find(pattern[j]) != std::string_view::npos)
-            ++j;
-        std::size_t digits = 0;
-        while (j < pattern.size() && pattern[j] >= '0' && pattern[j] <= '9' && digits < 3) {
-            ++j;
-            ++digits;
+            spec += pattern[j++];
+        if (j < pattern.size() && pattern[j] == '*') {
+            takeStar(999);
+        } else {
+            std::size_t digits = 0;
+            while (j < pattern.size() && pattern[j] >= '0' && pattern[j] <= '9' && digits < 3) {
+                spec += pattern[j++];
+                ++digits;
+            }
         }
         if (j < pattern.size() && pattern[j] == '.') {
-            ++j;
-            digits = 0;
-            while (j < pattern.size() && pattern[j] >= '0' && pattern[j] <= '9' && digits < 2) {
-                ++j;
-                ++digits;
+            spec += pattern[j++];
+            if (j < pattern.size() && pattern[j] == '*') {
+                takeStar(99);
+            } else {
+                std::size_t digits = 0;
+                while (j < pattern.size() && pattern[j] >= '0' && pattern[j] <= '9' && digits < 2) {
+                    spec += pattern[j++];
+                    ++digits;
+                }
             }
         }
         const char conv = j < pattern.size() ? pattern[j] : '\0';
@@ -181,7 +204,8 @@ std::string FormatPattern(std::string_view pattern, const std::vector<PatternArg
             ++i;
             continue;
         }
-        const std::string spec(pattern.substr(i, j - i + 1));
+        spec += conv;
+        next = argIndex;
         const PatternArg* arg = next < args.size() ? &args[next] : nullptr;
         ++next;
         if (conv == 's') {

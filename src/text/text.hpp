@@ -30,11 +30,11 @@ struct PatternArg {
 };
 
 // Fills the printf placeholders of a pattern that is data, not code: each conversion
-// (%s, %d, %i, %f, %g, %e, %x with flags, width and precision) takes the next argument,
-// converted to the placeholder's type; "%%" is a percent sign. A placeholder with no
-// argument left takes the empty text or zero, and anything that is not a plain
-// conversion (%n, %p, "*" widths...) is copied as it stands, so no pattern can read
-// memory it was not given.
+// (%s, %d, %i, %f, %g, %e, %x with flags, width and precision, "*" taking a bounded width
+// or precision from the arguments) takes the next argument, converted to the
+// placeholder's type; "%%" is a percent sign. A placeholder with no argument left takes
+// the empty text or zero, and anything that is not a plain conversion (%n, %p, %ls...) is
+// copied as it stands, so no pattern can read memory it was not given.
 std::string FormatPattern(std::string_view pattern, const std::vector<PatternArg>& args);
 
 // "%d".

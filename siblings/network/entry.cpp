@@ -1,0 +1,75 @@
+// Entry point of the network sizing stand-in (VelReseDimVRD15.arx): its service, its
+// commands, and the two functions the metre module calls by name.
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "network_commands.hpp"
+#include "network_records.hpp"
+#include "velhost/documents.h"
+#include "velhost/rx.h"
+
+namespace {
+
+constexpr const char* kServiceName = "VelantoReseDimServices r17.2";
+
+class CVelReseDimSrv final : public AcRxService {
+ public:
+  const char* className() const override { return "CVelReseDimSrv"; }
+};
+
+CVelReseDimSrv* g_service = nullptr;
+
+void RemoveService()
+{
+    if (g_service == nullptr)
+        return;
+    AcRxDictionary* services = static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"));
+    if (services != nullptr && services->at(kServiceName) == g_service)
+        services->remove(kServiceName);
+    delete g_service;
+    g_service = nullptr;
+}
+
+} // namespace
+
+#define RSX_EXPORT extern "C" __attribute__((visibility("default")))
+
+RSX_EXPORT std::int32_t Rsx_WriteXDataMetres()
+{
+    AcDbDatabase* database = acdbHostApplicationServices()->workingDatabase();
+    if (database == nullptr)
+        return 1;
+    network::RecordReport report;
+    std::vector<std::string> warnings;
+    return network::WriteNetworkQuantities(*database, report, warnings);
+}
+
+RSX_EXPORT std::int32_t Rsx_GetRsxFromType(std::string* networkName, std::vector<std::string>* projects)
+{
+    return network::ProjectsOfNetwork(acdbHostApplicationServices()->workingDatabase(), networkName, projects);
+}
+
+RSX_EXPORT AcRx::AppRetCode acrxEntryPoint(AcRx::AppMsgCode message, void* appId)
+{
+    switch (message) {
+    case AcRx::kInitAppMsg:
+        acrxDynamicLinker()->unlockApplication(appId);
+        acrxDynamicLinker()->registerAppMDIAware(appId);
+        if (g_service == nullptr) {
+            g_service = new CVelReseDimSrv();
+            acrxDynamicLinker()->registerService(kServiceName, g_service);
+        }
+        if (!network::AddCommands()) {
+            RemoveService();
+            return AcRx::kRetError;
+        }
+        return AcRx::kRetOK;
+    case AcRx::kUnloadAppMsg:
+        network::RemoveCommands();
+        RemoveService();
+        return AcRx::kRetOK;
+    default:
+        return AcRx::kRetOK;
+    }
+}

@@ -302,6 +302,12 @@ bool AcRxDynamicLinker::loadModule(const char* fileName, bool printit, bool asCm
     return false;
   }
   undo.armed = false;
+  // The modules it loaded while starting serve it: it goes after them, so that unloading
+  // in reverse order takes it away while they are still there.
+  auto& modules = State().modules;
+  const auto at = std::find_if(modules.begin(), modules.end(),
+                               [module](const auto& m) { return m.get() == module; });
+  if (at != modules.end()) std::rotate(at, at + 1, modules.end());
   if (printit) acutPrintf("Module %s chargé.\n", path.c_str());
   return true;
 }

@@ -59,7 +59,12 @@ class MainServices final : public CVelMainServices {
   {
       const std::string profile = WithSlash(velHostSettings().profileDir);
       switch (code) {
-      case 1: return profile + "Donnees/";
+      case 1: {
+          // The user's schedule and settings are written there: it exists once asked for.
+          std::error_code error;
+          fs::create_directories(profile + "Donnees", error);
+          return profile + "Donnees/";
+      }
       case 2: {
           // The family's shared data live beside the modules folder.
           const fs::path modules(velHostSettings().modulesDir);

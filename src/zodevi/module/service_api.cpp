@@ -15,6 +15,13 @@ namespace {
 
 CZodEVIBdr* g_current = nullptr;
 
+// A selector names one of the 13 code patterns; any other would match the articles
+// whose key is empty (the lump sums).
+bool KnownSelector(const std::int32_t* selector)
+{
+    return selector != nullptr && *selector >= 0 && *selector <= kZodEVIMaterialTonnage;
+}
+
 std::int32_t Status(bool done)
 {
     return done ? kZodEVIOk : kZodEVIFailed;
@@ -124,7 +131,7 @@ ZODEVI_EXPORT std::int32_t ZodEVI_GetBdrPrice(const std::int32_t* selector, cons
 {
     if (price != nullptr)
         *price = 0;
-    if (g_current == nullptr || selector == nullptr || itemName == nullptr || price == nullptr)
+    if (g_current == nullptr || !KnownSelector(selector) || itemName == nullptr || price == nullptr)
         return kZodEVINotFound;
     return PriceStatus(GetPrice(*g_current, *selector, *itemName, *price, networkName));
 }
@@ -132,7 +139,7 @@ ZODEVI_EXPORT std::int32_t ZodEVI_GetBdrPrice(const std::int32_t* selector, cons
 ZODEVI_EXPORT std::int32_t ZodEVI_GetBdrPriceRsx(const std::int32_t* selector, const std::string* itemName,
                                                  CZodEVIStringMap* prices)
 {
-    if (g_current == nullptr || selector == nullptr || itemName == nullptr || prices == nullptr)
+    if (g_current == nullptr || !KnownSelector(selector) || itemName == nullptr || prices == nullptr)
         return kZodEVINotFound;
     return PriceStatus(GetPricesPerNetwork(*g_current, *selector, *itemName, *prices));
 }
@@ -141,7 +148,7 @@ ZODEVI_EXPORT std::int32_t ZodEVI_SetBdrPrice(const std::int32_t* selector, cons
                                               const double* price, std::string networkName)
 {
     // A price that is not a number would be written into the file as "nan".
-    if (g_current == nullptr || selector == nullptr || itemName == nullptr || price == nullptr ||
+    if (g_current == nullptr || !KnownSelector(selector) || itemName == nullptr || price == nullptr ||
         !std::isfinite(*price))
         return kZodEVIFailed;
     return Status(SetPrice(*g_current, *selector, *itemName, *price, networkName));
@@ -150,7 +157,7 @@ ZODEVI_EXPORT std::int32_t ZodEVI_SetBdrPrice(const std::int32_t* selector, cons
 ZODEVI_EXPORT std::int32_t ZodEVI_ShowBdrPrice(const std::int32_t* selector, const std::string* itemName,
                                                std::string networkName)
 {
-    if (g_current == nullptr || selector == nullptr || itemName == nullptr)
+    if (g_current == nullptr || !KnownSelector(selector) || itemName == nullptr)
         return kZodEVIFailed;
     return Status(ShowPrice(*g_current, *selector, *itemName, networkName));
 }

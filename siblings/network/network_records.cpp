@@ -50,8 +50,9 @@ double ElementCount(const Element& element)
 {
     if (!IsLinear(element.kind))
         return 1;
-    // A tolerance keeps 12.0000001 m of 6 m pipes at two pipes.
-    return std::max(1.0, std::ceil(element.length3d / element.usefulLength - 1e-6));
+    // A run that exceeds whole elements by less than a centimetre (a slope, a rounded
+    // coordinate) is taken up in the manholes' walls, not by one more element.
+    return std::max(1.0, std::ceil((element.length3d - 0.01) / element.usefulLength));
 }
 
 std::string RecordKey(const std::string& projectName)

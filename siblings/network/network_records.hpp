@@ -31,7 +31,8 @@ std::string QuantityKey(const std::string& name);
 // A project's quantities: total pipe length, then by model the 3D lengths and element
 // counts of pipes, ducts and supplies and the counts of fittings, then the trench volume
 // and, by depth class (mean depth of each pipe), the 2D length and the trench volume.
-// Element counts are rounded up per drawn element (a run of 13 m of 6 m pipes takes 3).
+// Element counts are rounded up per drawn element (a run of 13 m of 6 m pipes takes 3;
+// one of 12.005 m takes 2).
 std::vector<Quantity> ProjectQuantities(const Project& project, const std::vector<double>& depthBounds);
 
 // What writing the records did.

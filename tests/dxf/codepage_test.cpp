@@ -14,6 +14,7 @@ TEST(TextEncoding, FollowsTheVersionAndTheCodePage)
     EXPECT_FALSE(TextEncoding::For("AC1009", "").utf8);
     EXPECT_EQ(TextEncoding::For("AC1015", "").codepage, "ANSI_1252");
     EXPECT_EQ(TextEncoding::For("AC1015", "ANSI_1251").codepage, "ANSI_1251");
+    EXPECT_EQ(TextEncoding::For("AC1015", "ansi_1250").codepage, "ANSI_1250");
     EXPECT_EQ(TextEncoding::For("AC1015", "NO_SUCH_PAGE").codepage, "ANSI_1252");
 }
 

@@ -169,10 +169,14 @@ bool Iconv(const std::string& to, const std::string& from, std::string_view in, 
 TextEncoding TextEncoding::For(std::string_view acadver, std::string_view dwgcodepage)
 {
     TextEncoding e;
+    e.codepage.clear();
     // AC1021 (2007) and later always store UTF-8.
     e.utf8 = acadver.size() == 6 && acadver.substr(0, 2) == "AC" && acadver >= "AC1021";
-    if (!dwgcodepage.empty())
-        e.codepage = std::string(dwgcodepage);
+    // Some writers spell the code page in lower case ("ansi_1252").
+    for (char c : dwgcodepage)
+        e.codepage.push_back(c >= 'a' && c <= 'z' ? static_cast<char>(c - 'a' + 'A') : c);
+    if (dwgcodepage.empty())
+        e.codepage = "ANSI_1252";
     if (!IsKnownCodepage(e.codepage))
         e.codepage = "ANSI_1252";
     return e;

@@ -144,7 +144,9 @@ bool Source::Map(const std::string& path, std::string& error)
         error = FormatString("« %s » : lecture impossible (%s)", path.c_str(), std::strerror(mapErrno));
         return false;
     }
-    madvise(p, static_cast<std::size_t>(st.st_size), MADV_SEQUENTIAL | MADV_WILLNEED);
+    // One pass from start to end: read ahead, and drop pages behind.
+    madvise(p, static_cast<std::size_t>(st.st_size), MADV_SEQUENTIAL);
+    madvise(p, static_cast<std::size_t>(st.st_size), MADV_WILLNEED);
     mapping_ = p;
     data_ = static_cast<const char*>(p);
     size_ = static_cast<std::size_t>(st.st_size);

@@ -1,0 +1,117 @@
+#!/usr/bin/python3
+"""Runs velhost on the example project: loads the main services and the network sizing
+module, writes the network quantity records, saves, then checks the saved drawing with
+ezdxf: the records are there, hold the expected quantities, every key names an article of
+the example schedule, and the road and platform records are unchanged.
+
+usage: network_example.py VELHOST MODULES_DIR EXAMPLES_DIR WORK_DIR
+"""
+import os
+import shutil
+import subprocess
+import sys
+import xml.etree.ElementTree as ET
+
+import ezdxf
+
+SCRIPT = """OPEN projet_vrd.dxf
+APPLOAD Vel2000Srv
+APPLOAD VelReseDimVRD15
+RsxMetres
+SAVEAS resultat.dxf
+QUIT
+"""
+
+EXPECTED_OUTPUT = [
+    "Réseau EP, projet « EP Les Tilleuls » : 165.70 m de canalisations, 8 regard(s) ou accessoire(s)",
+    "Réseau EU, projet « EU Les Tilleuls » : 177.03 m de canalisations, 10 regard(s) ou accessoire(s)",
+    "Dessin enregistré dans",
+]
+
+# Quantities checked by value (counts exactly, lengths to the millimetre).
+EXPECTED = {
+    "EP Les Tilleuls": {'"RSX_SBL_NB_Regard 1000"': 4, '"RSX_SBL_NB_Avaloir 40x40"': 4,
+                        '"RSX_TUY_NB_PVC 315"': 14, '"RSX_TUY_LIN_3D_PVC 315"': 80.006},
+    "EU Les Tilleuls": {'"RSX_SBL_NB_Regard 1000"': 4, '"RSX_SBL_NB_Boîte de branchement"': 6,
+                        '"RSX_TUY_LIN_3D_PVC 160"': 27.0, '"RSX_TUY_NB_PVC 160"': 12,
+                        '"RSX_LIN_3.50_2D"': 70.0},
+}
+
+
+def record(entity):
+    tags = [tuple(t) for t in entity.get_xdata("DAZUVUVUD")]
+    assert tags[0] == (1000, "PRJ_NOM"), tags[:2]
+    quantities = {}
+    for (kc, key), (vc, value) in zip(tags[2::2], tags[3::2]):
+        assert kc == 1000 and vc in (1040, 1071), (key, vc)
+        quantities[key] = value
+    return tags[1][1], quantities
+
+
+def schedule_keys(path):
+    keys = {}
+    for article in ET.parse(path).getroot():
+        keys.setdefault(article.get("groupKey"), set()).add(article.get("quantityKey"))
+    return keys
+
+
+def main():
+    velhost, modules, examples, work = (os.path.abspath(a) for a in sys.argv[1:5])
+    shutil.rmtree(work, ignore_errors=True)
+    os.makedirs(work)
+    shutil.copy(os.path.join(examples, "projet_vrd.dxf"), work)
+    with open(os.path.join(work, "reseaux.scr"), "w", encoding="utf-8") as f:
+        f.write(SCRIPT)
+    run = subprocess.run([velhost, "--script", "reseaux.scr", "--modules", modules, "--profile",
+                          os.path.join(work, "profil")], cwd=work, capture_output=True, text=True, timeout=120)
+    output = run.stdout + run.stderr
+    failures = []
+    if run.returncode != 0:
+        failures.append("exit status %d" % run.returncode)
+    for text in EXPECTED_OUTPUT:
+        if text not in output:
+            failures.append("not in the output: %r" % text)
+    if failures:
+        print(output)
+        print("\n".join(failures))
+        return 1
+
+    saved = ezdxf.readfile(os.path.join(work, "resultat.dxf"))
+    original = ezdxf.readfile(os.path.join(examples, "projet_vrd.dxf"))
+    keys = schedule_keys(os.path.join(examples, "VelaBordereau.xml"))
+    if "DAZUVUVUD" not in saved.appids:
+        failures.append("application DAZUVUVUD not registered")
+    projects = saved.rootdict["VELANTO_RSX_VRD"]["PROJECTS"]
+    networks = {"EP Les Tilleuls": "EP", "EU Les Tilleuls": "EU"}
+    if sorted(projects.keys()) != sorted(networks):
+        failures.append("network records: %s" % sorted(projects.keys()))
+    for entry, network in networks.items():
+        name, quantities = record(projects[entry])
+        if name != entry:
+            failures.append("record %s names the project %r" % (entry, name))
+        for key, value in EXPECTED[entry].items():
+            if key not in quantities or abs(quantities[key] - value) > 5e-4:
+                failures.append("%s %s: %r, expected %r" % (entry, key, quantities.get(key), value))
+        group = keys.get("PRJ_RES(%s)" % network, set())
+        for key in quantities:
+            if key not in group:
+                failures.append("%s: no article of the example schedule counts %s" % (entry, key))
+    road_group = keys["PRJ_PFM(),PRJ_RTE(),PRJ_PCV()"]
+    for first, second in (("VELANTO_ROUT2_DICT", "VELANTO_ROUT2_PROJ"), ("VELANTO_PFM_VRD", "PROJECTS")):
+        for entry, value in original.rootdict[first][second].items():
+            before = record(value)
+            after = record(saved.rootdict[first][second][entry])
+            if before != after:
+                failures.append("%s/%s changed" % (second, entry))
+            for key in before[1]:
+                if key not in road_group:
+                    failures.append("%s: no article of the example schedule counts %s" % (entry, key))
+    if failures:
+        print(output)
+        print("\n".join(failures))
+        return 1
+    return 0
+
+
+if __name__ == "__main__":
+    sys.exit(main())

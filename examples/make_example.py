@@ -169,6 +169,8 @@ def write_drawing(path):
     roads.add_xrecord(ROAD[0]).set_xdata(RECORD_APP, record_xdata(*ROAD))
     platforms = root.add_new_dict("VELANTO_PFM_VRD").add_new_dict("PROJECTS")
     platforms.add_xrecord(PLATFORM[0]).set_xdata(RECORD_APP, record_xdata(*PLATFORM))
+    # Fixed dates and identifiers: running the script again gives the same file.
+    ezdxf.options.write_fixed_meta_data_for_testing = True
     doc.saveas(path)
 
 
@@ -326,7 +328,7 @@ def real_text(value):
 
 
 def xml_attribute(text):
-    return (text.replace("&", "&amp;").replace("<", "&lt;").replace(">", "&gt;").replace('"', "&quot;")
+    return (text.replace("&", "&amp;").replace("<", "&lt;").replace('"', "&quot;")
             .replace("\r", "&#13;").replace("\n", "&#10;").replace("\t", "&#9;"))
 
 

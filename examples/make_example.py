@@ -20,6 +20,7 @@ Run: /usr/bin/python3 examples/make_example.py   (needs python3-ezdxf)
 """
 import os
 import re
+import sys
 
 import ezdxf
 
@@ -118,6 +119,8 @@ def record_xdata(name, quantities):
 
 
 def write_drawing(path):
+    # Fixed dates and identifiers: running the script again gives the same file.
+    ezdxf.options.write_fixed_meta_data_for_testing = True
     doc = ezdxf.new("R2018", setup=False)
     doc.header["$INSUNITS"] = 6  # metres
     for app in (NETWORK_APP, RECORD_APP):
@@ -169,8 +172,6 @@ def write_drawing(path):
     roads.add_xrecord(ROAD[0]).set_xdata(RECORD_APP, record_xdata(*ROAD))
     platforms = root.add_new_dict("VELANTO_PFM_VRD").add_new_dict("PROJECTS")
     platforms.add_xrecord(PLATFORM[0]).set_xdata(RECORD_APP, record_xdata(*PLATFORM))
-    # Fixed dates and identifiers: running the script again gives the same file.
-    ezdxf.options.write_fixed_meta_data_for_testing = True
     doc.saveas(path)
 
 
@@ -398,6 +399,10 @@ def priced_schedule():
 
 
 def main():
+    # ezdxf writes some objects in the order of a set: a fixed hash seed keeps the file
+    # the same from one run to the next.
+    if os.environ.get("PYTHONHASHSEED") != "0":
+        os.execve(sys.executable, [sys.executable] + sys.argv, dict(os.environ, PYTHONHASHSEED="0"))
     write_drawing(os.path.join(HERE, "projet_vrd.dxf"))
     write_schedule(os.path.join(HERE, "VelaBordereau.xml"), priced_schedule())
 

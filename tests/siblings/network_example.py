@@ -4,7 +4,11 @@ module, writes the network quantity records, saves, then checks the saved drawin
 ezdxf: the records are there, hold the expected quantities, every key names an article of
 the example schedule, and the road and platform records are unchanged.
 
-usage: network_example.py VELHOST MODULES_DIR EXAMPLES_DIR WORK_DIR
+With --schedule the metre module is loaded too and the network update command runs
+first: the example schedule already holds every article of both networks, so nothing is
+added and the schedule is written back byte for byte.
+
+usage: network_example.py VELHOST MODULES_DIR EXAMPLES_DIR WORK_DIR [--schedule]
 """
 import os
 import shutil
@@ -21,6 +25,20 @@ RsxMetres
 SAVEAS resultat.dxf
 QUIT
 """
+SCHEDULE_SCRIPT = """OPEN projet_vrd.dxf
+APPLOAD Vel2000Srv
+APPLOAD VelVuzazORE15
+APPLOAD VelReseDimVRD15
+RsxMajBordereau
+RsxMetres
+SAVEAS resultat.dxf
+QUIT
+"""
+SCHEDULE_OUTPUT = [
+    "Réseau EP (indice 0) : 3 modèle(s) de canalisation, 2 de regard : bordereau déjà à jour.",
+    "Réseau EU (indice 1) : 2 modèle(s) de canalisation, 2 de regard : bordereau déjà à jour.",
+    "Bordereau des prix enregistré.",
+]
 
 EXPECTED_OUTPUT = [
     "Réseau EP, projet « EP Les Tilleuls » : 165.70 m de canalisations, 8 regard(s) ou accessoire(s)",
@@ -57,20 +75,26 @@ def schedule_keys(path):
 
 def main():
     velhost, modules, examples, work = (os.path.abspath(a) for a in sys.argv[1:5])
+    with_schedule = sys.argv[5:] == ["--schedule"]
     shutil.rmtree(work, ignore_errors=True)
     os.makedirs(work)
     shutil.copy(os.path.join(examples, "projet_vrd.dxf"), work)
+    shutil.copy(os.path.join(examples, "VelaBordereau.xml"), work)
     with open(os.path.join(work, "reseaux.scr"), "w", encoding="utf-8") as f:
-        f.write(SCRIPT)
+        f.write(SCHEDULE_SCRIPT if with_schedule else SCRIPT)
     run = subprocess.run([velhost, "--script", "reseaux.scr", "--modules", modules, "--profile",
                           os.path.join(work, "profil")], cwd=work, capture_output=True, text=True, timeout=120)
     output = run.stdout + run.stderr
     failures = []
     if run.returncode != 0:
         failures.append("exit status %d" % run.returncode)
-    for text in EXPECTED_OUTPUT:
+    for text in EXPECTED_OUTPUT + (SCHEDULE_OUTPUT if with_schedule else []):
         if text not in output:
             failures.append("not in the output: %r" % text)
+    with open(os.path.join(examples, "VelaBordereau.xml"), "rb") as f, \
+            open(os.path.join(work, "VelaBordereau.xml"), "rb") as g:
+        if f.read() != g.read():
+            failures.append("the schedule was changed")
     if failures:
         print(output)
         print("\n".join(failures))

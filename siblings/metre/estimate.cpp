@@ -405,8 +405,8 @@ FileResult WriteEstimateWorkbook(const std::string& path, const Estimate& estima
         }
         case K::Total: {
             worksheet_write_string(sheet, line, 1, "Total HT", bold);
-            worksheet_write_formula_num(sheet, line, 5, ("=" + SumOfCells(subtotalCells)).c_str(), moneyBold,
-                                        estimate.totalExclTax);
+            const std::string formula = FormatString("=%s", SumOfCells(subtotalCells).c_str());
+            worksheet_write_formula_num(sheet, line, 5, formula.c_str(), moneyBold, estimate.totalExclTax);
             totalRow = r;
             break;
         }
@@ -421,7 +421,9 @@ FileResult WriteEstimateWorkbook(const std::string& path, const Estimate& estima
         }
         case K::TotalIncl: {
             worksheet_write_string(sheet, line, 1, "Total TTC", bold);
-            const std::string formula = "=" + Cell('F', totalRow) + (taxCells.empty() ? "" : "+" + SumOfCells(taxCells));
+            const std::string formula =
+                FormatString("=%s%s%s", Cell('F', totalRow).c_str(), taxCells.empty() ? "" : "+",
+                             taxCells.empty() ? "" : SumOfCells(taxCells).c_str());
             worksheet_write_formula_num(sheet, line, 5, formula.c_str(), moneyBold, estimate.totalInclTax);
             break;
         }

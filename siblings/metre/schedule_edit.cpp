@@ -200,7 +200,7 @@ bool ScheduleEdit::Add(const std::string& treePath, std::string& error)
     Entry entry;
     entry.article.treePath = treePath;
     entry.article.metreInt4 = 0;
-    entry.article.groupKey = "0";
+    entry.article.groupKey.assign(1, '0');
     entry.treePathSet = true;
     FillFromTreePath(entry.article, true, true, true);
     entries_.push_back(std::move(entry));
@@ -372,7 +372,7 @@ bool ParseScheduleTable(std::string_view text, const std::string& name, Schedule
             if (trimmed == "[nouveau]") {
                 entries.push_back({std::nullopt, CZodEVIArticle(), false});
                 entries.back().article.metreInt4 = 0;
-                entries.back().article.groupKey = "0";
+                entries.back().article.groupKey.assign(1, '0');
                 newBlockLines.push_back(lineNumber);
                 newBlockGiven.push_back({false, false, false});
             } else {

@@ -215,7 +215,7 @@ bool GetPricesPerNetwork(const CZodEVIBdr& bdr, int selector, const std::string&
     for (const auto& [key, group] : bdr.Groups()) {
         std::string name;
         if (EqualsNoCase(key, generalKey)) {
-            name = "*";
+            name.assign(1, '*');
         } else {
             if (bdr.NetworkIndexOf(key) == nullptr)
                 continue;

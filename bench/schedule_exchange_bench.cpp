@@ -1,0 +1,134 @@
+// Reading and writing schedules of 1,000 to 100,000 articles through the exchange (the
+// store's Read and Write, the metre module's XML file behind them), side by side with a
+// bare pugixml parse and save of the same file.
+#include "schedule/schedule_exchange.hpp"
+
+#include "metre_services.hpp"
+#include "module/siblings.hpp"
+#include "text/text.hpp"
+#include "velhost/rx.h"
+
+#include <benchmark/benchmark.h>
+#include <pugixml.hpp>
+
+#include <filesystem>
+
+namespace {
+
+namespace fs = std::filesystem;
+
+std::int32_t Fill(std::string file, std::vector<CZodEVIArticle*>* table, std::int32_t)
+{
+    return metre::FillArticles(file, table);
+}
+
+std::int32_t Export(std::string file, std::vector<CZodEVIArticle*>* table, std::int32_t)
+{
+    return metre::ExportArticles(file, table);
+}
+
+fs::path Folder()
+{
+    static const fs::path folder = [] {
+        fs::path f = fs::temp_directory_path() / "bench_schedule_exchange";
+        fs::create_directories(f);
+        return f;
+    }();
+    return folder;
+}
+
+// A schedule of n articles as a network update leaves it, written once per size.
+std::string ScheduleFile(std::int64_t n)
+{
+    const std::string path = (Folder() / FormatString("bordereau_%lld.xml", static_cast<long long>(n))).string();
+    if (fs::exists(path))
+        return path;
+    CZodEVIBdr bdr;
+    bdr.path = path;
+    for (std::int64_t i = 0; i < n; ++i) {
+        auto a = std::make_unique<CZodEVIArticle>();
+        const std::string network = FormatString("EU%lld", static_cast<long long>(i % 20));
+        a->code = FormatString("EU-%03lld", static_cast<long long>(i % 1000 + 1));
+        a->number = static_cast<int>(i + 1);
+        a->unitPrice = 10 + (i % 997) * 0.37;
+        a->designation = FormatString("Tuyau PVC %lld « assainissement »", static_cast<long long>(100 + i % 400));
+        a->description = "Article associé aux réseaux EU.\r\nFourniture et pose, y compris lit de pose.";
+        a->unit = "ml";
+        a->quantityKey = FormatString("\"RSX_TUY_LIN_3D_PVC %lld\"", static_cast<long long>(i));
+        a->groupKey = "PRJ_RES(" + network + ")";
+        a->treePath = "Réseaux\\\\" + network + "\\\\Canalisations\\\\Linéaire\\\\" + a->code + " - " + a->designation;
+        bdr.GroupOf(a->groupKey, true)->push_back(bdr.AddArticle(std::move(a)));
+    }
+    Write(bdr);
+    return path;
+}
+
+void RegisterMetre()
+{
+    static bool done = false;
+    if (done)
+        return;
+    velRegisterInProcessService(kMetreService, new AcRxService(),
+                                {{"VtMetre_RemplitTableau", reinterpret_cast<void*>(&Fill)},
+                                 {"VtMetre_ExporterXml", reinterpret_cast<void*>(&Export)}});
+    done = true;
+}
+
+void BM_Read(benchmark::State& state)
+{
+    RegisterMetre();
+    CZodEVIBdr bdr;
+    bdr.path = ScheduleFile(state.range(0));
+    for (auto _ : state) {
+        if (!Read(bdr))
+            state.SkipWithError("Read failed");
+        benchmark::DoNotOptimize(bdr.Articles().size());
+    }
+    state.SetBytesProcessed(static_cast<std::int64_t>(state.iterations() * fs::file_size(bdr.path)));
+}
+
+void BM_BareParse(benchmark::State& state)
+{
+    const std::string path = ScheduleFile(state.range(0));
+    for (auto _ : state) {
+        pugi::xml_document document;
+        if (!document.load_file(path.c_str()))
+            state.SkipWithError("parse failed");
+        benchmark::DoNotOptimize(document.first_child());
+    }
+    state.SetBytesProcessed(static_cast<std::int64_t>(state.iterations() * fs::file_size(path)));
+}
+
+void BM_Write(benchmark::State& state)
+{
+    RegisterMetre();
+    CZodEVIBdr bdr;
+    bdr.path = ScheduleFile(state.range(0));
+    Read(bdr);
+    bdr.path = (Folder() / "written.xml").string();
+    for (auto _ : state)
+        if (!Write(bdr))
+            state.SkipWithError("Write failed");
+    state.SetBytesProcessed(static_cast<std::int64_t>(state.iterations() * fs::file_size(bdr.path)));
+}
+
+void BM_BareSave(benchmark::State& state)
+{
+    const std::string path = ScheduleFile(state.range(0));
+    pugi::xml_document document;
+    document.load_file(path.c_str());
+    const std::string out = (Folder() / "saved.xml").string();
+    for (auto _ : state)
+        if (!document.save_file(out.c_str()))
+            state.SkipWithError("save failed");
+    state.SetBytesProcessed(static_cast<std::int64_t>(state.iterations() * fs::file_size(out)));
+}
+
+BENCHMARK(BM_Read)->Arg(1000)->Arg(10000)->Arg(100000)->Unit(benchmark::kMillisecond);
+BENCHMARK(BM_BareParse)->Arg(1000)->Arg(10000)->Arg(100000)->Unit(benchmark::kMillisecond);
+BENCHMARK(BM_Write)->Arg(1000)->Arg(10000)->Arg(100000)->Unit(benchmark::kMillisecond);
+BENCHMARK(BM_BareSave)->Arg(1000)->Arg(10000)->Arg(100000)->Unit(benchmark::kMillisecond);
+
+} // namespace
+
+BENCHMARK_MAIN();

@@ -35,6 +35,7 @@ void RemoveService()
 
 #define RSX_EXPORT extern "C" __attribute__((visibility("default")))
 
+// 0 the records are written, 1 no drawing is open, 2 the drawing refused a change.
 RSX_EXPORT std::int32_t Rsx_WriteXDataMetres()
 {
     AcDbDatabase* database = acdbHostApplicationServices()->workingDatabase();
@@ -45,6 +46,7 @@ RSX_EXPORT std::int32_t Rsx_WriteXDataMetres()
     return network::WriteNetworkQuantities(*database, report, warnings);
 }
 
+// 0 the list holds the network's projects, 1 none (or no drawing), 2 a null argument.
 RSX_EXPORT std::int32_t Rsx_GetRsxFromType(std::string* networkName, std::vector<std::string>* projects)
 {
     return network::ProjectsOfNetwork(acdbHostApplicationServices()->workingDatabase(), networkName, projects);

@@ -31,11 +31,6 @@ void PrintWarnings(const std::vector<std::string>& warnings)
         acutPrintf("\n");
 }
 
-CZodEVIStringList Models(const Network& network, ElementKind kind)
-{
-    return network.Models(kind);
-}
-
 void UpdateCommand()
 {
     UpdateSchedule();
@@ -87,11 +82,11 @@ bool UpdateSchedule()
     }
     for (const Network& network : drawing.networks) {
         const std::int32_t index = network.index;
-        const CZodEVIStringList models = Models(network, ElementKind::Pipe);
-        const CZodEVIStringList pipeSupplies = Models(network, ElementKind::PipeSupply);
-        const CZodEVIStringList fittings = Models(network, ElementKind::Fitting);
-        const CZodEVIStringList fittingSupplies = Models(network, ElementKind::FittingSupply);
-        const CZodEVIStringList ducts = Models(network, ElementKind::Duct);
+        const CZodEVIStringList models = network.Models(ElementKind::Pipe);
+        const CZodEVIStringList pipeSupplies = network.Models(ElementKind::PipeSupply);
+        const CZodEVIStringList fittings = network.Models(ElementKind::Fitting);
+        const CZodEVIStringList fittingSupplies = network.Models(ElementKind::FittingSupply);
+        const CZodEVIStringList ducts = network.Models(ElementKind::Duct);
         // Trench structures are not drawn by this module: no material names.
         const CZodEVIStringList materials;
         CZodEVIRealArray bounds;

@@ -165,7 +165,7 @@ std::map<std::string, std::map<std::string, double>> Projects(AcDbDatabase& db, 
 
 TEST(AcDbDictionary, ProjectRecordsReadFromEveryVersion)
 {
-    for (const char* file : {"r2000.dxf", "r2004_1252.dxf", "r2018.dxf", "crlf.dxf"}) {
+    for (const char* file : {"r2000.dxf", "r2004_1252.dxf", "r2018.dxf", "crlf.dxf", "r2018_bin.dxf"}) {
         SCOPED_TRACE(file);
         auto db = OpenFixture(file);
         const auto networks = Projects(*db, "VELANTO_RSX_VRD", "PROJECTS");

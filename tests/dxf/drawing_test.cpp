@@ -54,6 +54,8 @@ TEST(Drawing, FixturesReadAndWriteBackByteForByte)
         {"r2004_1252.dxf", "AC1018", 37, "0", 4},
         {"r2018.dxf", "AC1032", 37, "0", 3},
         {"crlf.dxf", "AC1032", 37, "0", 3},
+        {"r2018_bin.dxf", "AC1032", 37, "0", 3},
+        {"r12_bin.dxf", "AC1009", 20583, "0", 3},
     };
     for (const auto& c : cases) {
         SCOPED_TRACE(c.file);
@@ -247,7 +249,7 @@ TEST(Drawing, MalformedFilesAreRefusedWithFileLineAndExpectation)
          0, "un entier pour $OSMODE"},
         {"entry without table", Replace(sound, "  0\nTABLE\n  2\nLAYER\n  5\n2\n 70\n1\n", ""), "  0\nLAYER", 0,
          "0 TABLE avant l'entrée de table"},
-        {"binary DXF", "AutoCAD Binary DXF\r\n\x1a", "", 0, "un DXF texte (le DXF binaire n'est pas pris en charge)"},
+        {"cut binary signature", "AutoCAD Binary DXF\r\n\x1a", "", 0, "la signature complète du DXF binaire"},
     };
     for (const auto& c : cases) {
         SCOPED_TRACE(c.name);
@@ -258,7 +260,7 @@ TEST(Drawing, MalformedFilesAreRefusedWithFileLineAndExpectation)
         std::uint32_t line = c.marker.empty() ? 0 : LineOf(c.text, c.marker);
         if (c.marker.empty())
             line = static_cast<std::uint32_t>(std::count(c.text.begin(), c.text.end(), '\n')) + 1;
-        if (std::string(c.name) == "binary DXF")
+        if (std::string(c.name) == "cut binary signature")
             line = 1;
         EXPECT_EQ(error, "« plan.dxf », ligne " + std::to_string(line + c.lineShift) + " : il fallait " + c.expected);
     }
@@ -317,6 +319,37 @@ TEST(Drawing, HandlesUseAll64Bits)
     delete tooMany;
     last->close();
     nod->close();
+}
+
+TEST(Drawing, BinaryDrawingsAreWrittenBackInBinary)
+{
+    for (const char* file : {"r2018_bin.dxf", "r12_bin.dxf"}) {
+        SCOPED_TRACE(file);
+        auto db = Open(Fixture(file));
+        AcDbObjectId layer;
+        ASSERT_EQ(db->addLayer("BINAIRE", layer), Acad::eOk);
+        ASSERT_EQ(db->setClayer(layer), Acad::eOk);
+        const std::string bytes = Written(*db);
+        EXPECT_EQ(bytes.substr(0, 22), std::string_view("AutoCAD Binary DXF\r\n\x1a\0", 22));
+        std::unique_ptr<AcDbDatabase> back;
+        std::string error;
+        ASSERT_TRUE(velReadDrawing(bytes, file, back, error)) << error;
+        EXPECT_EQ(back->layerName(back->clayer()), "BINAIRE");
+        EXPECT_EQ(back->dxfVersion(), db->dxfVersion());
+    }
+}
+
+TEST(Drawing, MalformedBinaryDrawingsNameTheGroup)
+{
+    const std::string good = Slurp(Fixture("r2018_bin.dxf"));
+    std::unique_ptr<AcDbDatabase> db;
+    std::string error;
+    EXPECT_FALSE(velReadDrawing(good.substr(0, 40), "b.dxf", db, error));
+    EXPECT_EQ(error, "« b.dxf » (DXF binaire), groupe 2 : il fallait un texte terminé par un octet nul (fichier tronqué)");
+    std::string spoiled = good;
+    spoiled.replace(24, 7, "SECTIOX");
+    EXPECT_FALSE(velReadDrawing(spoiled, "b.dxf", db, error));
+    EXPECT_EQ(error, "« b.dxf » (DXF binaire), groupe 1 : il fallait 0 SECTION");
 }
 
 TEST(Drawing, OpenAndSaveReportFileErrors)

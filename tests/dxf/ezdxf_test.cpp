@@ -81,6 +81,8 @@ TEST(EzdxfRoundTrip, OnlyWhatTheHostChangedDiffers)
         {"r2004_1252.dxf", true, "None", "\\\\U+03A9"},
         {"r2018.dxf", true, "None", "Ω"},
         {"crlf.dxf", true, "None", "Ω"},
+        {"r2018_bin.dxf", true, "None", "Ω"},
+        {"r12_bin.dxf", false, "20583", ""},
     };
     for (const auto& c : cases) {
         SCOPED_TRACE(c.file);

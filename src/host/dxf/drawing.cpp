@@ -12,6 +12,7 @@
 #include <cerrno>
 #include <cstring>
 
+#include "host/dxf/binary.hpp"
 #include "text/text.hpp"
 
 namespace vel::dxf {
@@ -166,6 +167,8 @@ DrawingFile::~DrawingFile() = default;
 
 std::string DrawingFile::Where(std::uint32_t line) const
 {
+    if (binary)
+        return FormatString("« %s » (DXF binaire), groupe %u", fileName.c_str(), (line + 1) / 2);
     return FormatString("« %s », ligne %u", fileName.c_str(), line);
 }
 
@@ -178,7 +181,7 @@ bool DrawingFile::Scan(std::string& error)
 {
     const std::string_view buf = source->view();
     if (buf.substr(0, 18) == "AutoCAD Binary DXF") {
-        error = Fail(1, "un DXF texte (le DXF binaire n'est pas pris en charge)");
+        error = Fail(1, "la signature complète du DXF binaire");
         return false;
     }
     std::size_t start = buf.substr(0, 3) == "\xEF\xBB\xBF" ? 3 : 0;
@@ -549,6 +552,19 @@ bool DrawingFile::Load(AcDbDatabase& db, std::unique_ptr<Source> src, const std:
     auto file = std::make_unique<DrawingFile>(&db);
     file->source = std::move(src);
     file->fileName = name;
+    if (IsBinaryDxf(file->source->view())) {
+        std::string text;
+        std::uint64_t group = 0;
+        std::string expected;
+        if (!BinaryToText(file->source->view(), text, file->wideCodes, group, expected)) {
+            error = FormatString("« %s » (DXF binaire), groupe %llu : il fallait %s", name.c_str(),
+                                 static_cast<unsigned long long>(group), expected.c_str());
+            return false;
+        }
+        file->binary = true;
+        file->source = std::make_unique<Source>();
+        file->source->Own(std::move(text));
+    }
     if (!file->Scan(error) || !file->ReadStructure(error) || !file->ReadHeader(error))
         return false;
     if (file->encoding.utf8) {
@@ -890,6 +906,30 @@ void DrawingFile::WriteHeader(Writer& w, const std::vector<std::string>& changed
 }
 
 bool DrawingFile::Write(const std::function<bool(std::string_view)>& sink, std::string& error)
+{
+    if (!binary)
+        return WriteText(sink, error);
+    std::string text;
+    if (!WriteText(
+            [&](std::string_view piece) {
+                text.append(piece);
+                return true;
+            },
+            error))
+        return false;
+    std::string bytes;
+    if (!TextToBinary(text, wideCodes, bytes, error)) {
+        error = "conversion en DXF binaire impossible, " + error;
+        return false;
+    }
+    if (!sink(bytes)) {
+        error = "écriture interrompue";
+        return false;
+    }
+    return true;
+}
+
+bool DrawingFile::WriteText(const std::function<bool(std::string_view)>& sink, std::string& error)
 {
     const std::string_view buf = source->view();
     Writer w(buf, sink);

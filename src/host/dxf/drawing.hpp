@@ -113,6 +113,8 @@ public:
     std::string acadver = "AC1032";
     TextEncoding encoding;
     std::string eol = "\n";
+    bool binary = false;            // read from binary DXF (the source holds its text form)
+    bool wideCodes = true;          // binary group codes of two bytes (R13 and later)
     bool modified = false;
 
     Settings settings;
@@ -139,6 +141,7 @@ public:
     std::map<std::size_t, std::vector<std::size_t>> insertions;  // before record -> added records
 
 private:
+    bool WriteText(const std::function<bool(std::string_view)>& sink, std::string& error);
     bool Scan(std::string& error);
     bool ReadHeader(std::string& error);
     bool ReadStructure(std::string& error);

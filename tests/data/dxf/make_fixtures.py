@@ -148,6 +148,16 @@ def crlf():
         f.write(text.replace("\n", "\r\n"))
 
 
+def binary():
+    doc = ezdxf.new("R2018")
+    content(doc, "Binaire — Ω")
+    project_dicts(doc, hard_owned=True)
+    doc.saveas("r2018_bin.dxf", fmt="bin")
+    doc = ezdxf.new("R12")
+    content(doc, "R12 binaire")
+    doc.saveas("r12_bin.dxf", fmt="bin")
+
+
 if __name__ == "__main__":
     r12()
     r2000()
@@ -155,3 +165,4 @@ if __name__ == "__main__":
     r2018()
     patch_r2018()
     crlf()
+    binary()

@@ -71,17 +71,27 @@ protected:
     void SetUp() override
     {
         previousUI = velSetUI(&ui);
+        Reset();
+    }
+    void TearDown() override
+    {
+        Clean();
+        velSetUI(previousUI);
+    }
+    void Reset()
+    {
         g_calls.clear();
         g_updateAnswer = kZodEVIOk;
         g_writeAnswer = kZodEVIOk;
         g_writes = 0;
+        output.str("");
     }
-    void TearDown() override
+    // No service and no drawing left behind.
+    void Clean()
     {
         auto* services = static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"));
         services->remove(kZodEVIServiceName);
         acDocManager->closeAll();
-        velSetUI(previousUI);
     }
     void OfferService(bool withWrite = true)
     {
@@ -166,7 +176,7 @@ TEST_F(NetworkCommands, UpdateReportsEveryFailure)
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.name);
-        SetUp();
+        Reset();
         if (c.document)
             Open(c.entities);
         if (c.service > 0)
@@ -176,8 +186,7 @@ TEST_F(NetworkCommands, UpdateReportsEveryFailure)
         EXPECT_EQ(UpdateSchedule(), c.result);
         EXPECT_EQ(g_calls.size(), c.calls);
         EXPECT_TRUE(Printed(c.message)) << output.str();
-        TearDown();
-        output.str("");
+        Clean();
     }
 }
 

@@ -350,6 +350,14 @@ TEST(Drawing, MalformedBinaryDrawingsNameTheGroup)
     spoiled.replace(24, 7, "SECTIOX");
     EXPECT_FALSE(velReadDrawing(spoiled, "b.dxf", db, error));
     EXPECT_EQ(error, "« b.dxf » (DXF binaire), groupe 1 : il fallait 0 SECTION");
+    // Values the text form could not give back bit for bit are refused.
+    std::string nan("AutoCAD Binary DXF\r\n\x1a\0\0\0SECTION\0\x02\0HEADER\0\x09\0$ANGBASE\0\x32\0", 54);
+    nan.append("\0\0\0\0\0\0\xF8\x7F", 8);
+    EXPECT_FALSE(velReadDrawing(nan, "b.dxf", db, error));
+    EXPECT_EQ(error, "« b.dxf » (DXF binaire), groupe 4 : il fallait un nombre réel fini");
+    const std::string negative("AutoCAD Binary DXF\r\n\x1a\0\0\0SECTION\0\xFE\xFFx\0", 36);
+    EXPECT_FALSE(velReadDrawing(negative, "b.dxf", db, error));
+    EXPECT_EQ(error, "« b.dxf » (DXF binaire), groupe 2 : il fallait un code de groupe de 0 à 32767");
 }
 
 TEST(Drawing, OpenAndSaveReportFileErrors)

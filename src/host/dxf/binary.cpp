@@ -3,6 +3,7 @@
 #include "host/dxf/binary.hpp"
 
 #include <charconv>
+#include <cmath>
 #include <cstring>
 
 #include "host/dxf/tags.hpp"
@@ -95,7 +96,16 @@ bool BinaryToText(std::string_view binary, std::string& text, bool& wideCodes, s
                 }
                 code = Load<std::int16_t>(p);
                 p += 2;
+                // Written back the same way only when the short form could not hold it.
+                if (code < 255) {
+                    expected = "un code de groupe de 255 ou plus après l'octet 255";
+                    return false;
+                }
             }
+        }
+        if (code < 0) {
+            expected = "un code de groupe de 0 à 32767";
+            return false;
         }
         std::string value;
         switch (KindOf(code)) {
@@ -137,8 +147,13 @@ bool BinaryToText(std::string_view binary, std::string& text, bool& wideCodes, s
                 AppendNumber(value, Load<std::int64_t>(p));
             else {
                 // The shortest digits that read back to the same bits.
+                const double real = Load<double>(p);
+                if (!std::isfinite(real)) {
+                    expected = "un nombre réel fini";
+                    return false;
+                }
                 char buffer[64];
-                const auto r = std::to_chars(buffer, buffer + sizeof buffer, Load<double>(p));
+                const auto r = std::to_chars(buffer, buffer + sizeof buffer, real);
                 value.assign(buffer, r.ptr);
             }
             p += size;

@@ -179,6 +179,27 @@ TEST(AcDbDictionary, ProjectRecordsReadFromEveryVersion)
     }
 }
 
+TEST(AcDbXrecord, LongStringsOfAnXrecordWithoutCloningFlag)
+{
+    auto db = OpenFixture("r2018.dxf");
+    AcDbDictionary* nod = nullptr;
+    ASSERT_EQ(db->getNamedObjectsDictionary(nod, AcDb::kForRead), Acad::eOk);
+    AcDbObject* object = nullptr;
+    ASSERT_EQ(nod->getAt("SANS_DRAPEAU", object, AcDb::kForRead), Acad::eOk);
+    auto* record = dynamic_cast<AcDbXrecord*>(object);
+    ASSERT_NE(record, nullptr);
+    resbuf* chain = nullptr;
+    ASSERT_EQ(record->rbChain(chain), Acad::eOk);
+    VelRbPtr owned(chain);
+    ASSERT_TRUE(chain);
+    EXPECT_EQ(chain->restype, 1);
+    EXPECT_EQ(velRbText(chain).size(), 3000u);
+    ASSERT_TRUE(chain->rbnext);
+    EXPECT_EQ(chain->rbnext->resval.rpoint[2], 3.0);
+    object->close();
+    nod->close();
+}
+
 TEST(AcDbObject, SetXDataNeedsWriteAccessAndAWellFormedList)
 {
     AcDbDatabase db;

@@ -196,10 +196,11 @@ FileResult ReadScheduleText(std::string_view text, const std::string& name, Arti
     const auto& index = FieldIndex();
     ArticleVector read;
     for (pugi::xml_node node = root.first_child(); node; node = node.next_sibling()) {
-        const int line = LineOfOffset(text, node.offset_debug());
+        // Counting lines is only worth it for a message: it would make reading quadratic.
+        const auto lineOf = [&] { return LineOfOffset(text, node.offset_debug()); };
         if (node.type() != pugi::node_element || std::strcmp(node.name(), kScheduleArticle) != 0)
             return FileResult::Failure(FormatString("Bordereau « %s », ligne %d : élément <%s> attendu, %s trouvé.",
-                                                    name.c_str(), line, kScheduleArticle,
+                                                    name.c_str(), lineOf(), kScheduleArticle,
                                                     node.type() == pugi::node_element
                                                         ? FormatString("<%s>", node.name()).c_str()
                                                         : "du texte"));
@@ -213,17 +214,17 @@ FileResult ReadScheduleText(std::string_view text, const std::string& name, Arti
                 const auto found = index.find(attribute.name());
                 if (found == index.end())
                     return FileResult::Failure(FormatString("Bordereau « %s », ligne %d : article %zu, champ inconnu « %s ».",
-                                                            name.c_str(), line, read.size() + 1, attribute.name()));
+                                                            name.c_str(), lineOf(), read.size() + 1, attribute.name()));
                 position = found->second;
             }
             if (seen & (std::uint64_t{1} << position))
                 return FileResult::Failure(FormatString("Bordereau « %s », ligne %d : article %zu, champ « %s » en double.",
-                                                        name.c_str(), line, read.size() + 1, attribute.name()));
+                                                        name.c_str(), lineOf(), read.size() + 1, attribute.name()));
             seen |= std::uint64_t{1} << position;
             if (!SetField(*article, fields[position], attribute.value()))
                 return FileResult::Failure(FormatString(
                     "Bordereau « %s », ligne %d : article %zu, champ « %s » : %s attendu, « %s » trouvé.", name.c_str(),
-                    line, read.size() + 1, attribute.name(),
+                    lineOf(), read.size() + 1, attribute.name(),
                     fields[position].type == CZodEVIArticleField::Type::Int ? "nombre entier" : "nombre",
                     attribute.value()));
             expected = position + 1;

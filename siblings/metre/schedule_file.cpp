@@ -250,11 +250,12 @@ FileResult ReadScheduleFile(const std::string& path, ArticleVector& out)
     if (!in.is_open())
         return FileResult::Failure(FormatString("Bordereau « %s » : ouverture impossible (%s).", path.c_str(),
                                                 ErrnoText(errno).c_str()));
-    std::ostringstream content;
-    content << in.rdbuf();
-    if (!in.good() && !in.eof())
+    // One read of the whole file: large schedules are read many times a session.
+    std::string content(static_cast<std::size_t>(std::filesystem::file_size(path, error)), '\0');
+    in.read(content.data(), static_cast<std::streamsize>(content.size()));
+    if (error || in.gcount() != static_cast<std::streamsize>(content.size()))
         return FileResult::Failure(FormatString("Bordereau « %s » : lecture impossible.", path.c_str()));
-    return ReadScheduleText(content.view(), path, out);
+    return ReadScheduleText(content, path, out);
 }
 
 std::string ScheduleToXml(const std::vector<const CZodEVIArticle*>& articles)

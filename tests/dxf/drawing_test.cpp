@@ -11,6 +11,8 @@
 
 namespace {
 
+using vel::dxf::FormatHandle;
+
 std::string Slurp(const std::string& path)
 {
     std::ifstream in(path, std::ios::binary);
@@ -296,6 +298,26 @@ TEST(Drawing, DictionaryEntriesMayNameDictionariesOfAnySection)
     EXPECT_FALSE(velReadDrawing(looped, "boucle.dxf", db, error));
     EXPECT_EQ(error, "« boucle.dxf », ligne 75 : il fallait une entrée qui ne remonte pas à un dictionnaire parent "
                      "(« Z » ramène au dictionnaire de la ligne 47)");
+}
+
+TEST(Drawing, DuplicateHandlesFoundHoweverShuffled)
+{
+    for (int count : {3, 70}) {  // few ascending runs are merged, many are sorted
+        SCOPED_TRACE(count);
+        std::string lines;
+        for (int k = count; k > 0; --k)
+            lines += "  0\nLINE\n  5\n" + FormatHandle(0x100 + static_cast<unsigned>(k)) + "\n  8\n0\n";
+        const std::string sound = Replace(Sound(), "  0\nENDSEC\n  0\nSECTION\n  2\nOBJECTS", lines +
+                                          "  0\nENDSEC\n  0\nSECTION\n  2\nOBJECTS");
+        std::unique_ptr<AcDbDatabase> db;
+        std::string error;
+        ASSERT_TRUE(velReadDrawing(sound, "lignes.dxf", db, error)) << error;
+        EXPECT_FALSE(db->idFromHandle(0x101).isNull());
+        const std::string twice = Replace(sound, "  5\n102\n", "  5\n" + FormatHandle(0x100 + count) + "\n");
+        EXPECT_FALSE(velReadDrawing(twice, "lignes.dxf", db, error));
+        EXPECT_NE(error.find("il fallait un identifiant unique (" + FormatHandle(0x100 + count)), std::string::npos)
+            << error;
+    }
 }
 
 TEST(Drawing, HandlesUseAll64Bits)

@@ -468,8 +468,29 @@ bool DrawingFile::IndexHandles(std::string& error)
             index.push_back({records[i].handle, static_cast<std::uint32_t>(i)});
             maxHandle = std::max(maxHandle, records[i].handle);
         }
-    if (!std::is_sorted(index.begin(), index.end()))
+    // Handles mostly rise through each section: merge the ascending runs rather than
+    // sort from scratch, unless the file is too shuffled for that to pay.
+    std::vector<std::size_t> runs{0};
+    for (std::size_t k = 1; k < index.size() && runs.size() <= 64; ++k)
+        if (index[k] < index[k - 1])
+            runs.push_back(k);
+    if (runs.size() > 64) {
         std::sort(index.begin(), index.end());
+    } else {
+        runs.push_back(index.size());
+        while (runs.size() > 2) {
+            std::vector<std::size_t> merged{0};
+            for (std::size_t r = 0; r + 2 < runs.size(); r += 2) {
+                std::inplace_merge(index.begin() + static_cast<std::ptrdiff_t>(runs[r]),
+                                   index.begin() + static_cast<std::ptrdiff_t>(runs[r + 1]),
+                                   index.begin() + static_cast<std::ptrdiff_t>(runs[r + 2]));
+                merged.push_back(runs[r + 2]);
+            }
+            if (runs.size() % 2 == 0)  // an odd number of runs: the last one waits
+                merged.push_back(runs.back());
+            runs = std::move(merged);
+        }
+    }
     for (std::size_t k = 1; k < index.size(); ++k)
         if (index[k].first == index[k - 1].first) {
             const Record& a = records[std::min(index[k].second, index[k - 1].second)];

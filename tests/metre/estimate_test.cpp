@@ -212,6 +212,20 @@ TEST_F(EstimateTest, CsvQuotesWhatWouldSplitACell)
     EXPECT_NE(csv.find("DV-001;\"Bordure \"\"T2\"\"; pose\";"), std::string::npos) << csv;
 }
 
+// Output of a shell command (standard error included).
+std::string Shell(const std::string& command)
+{
+    std::string out;
+    FILE* pipe = popen((command + " 2>&1").c_str(), "r");
+    if (pipe == nullptr)
+        return out;
+    char buffer[4096];
+    while (std::size_t n = fread(buffer, 1, sizeof buffer, pipe))
+        out.append(buffer, n);
+    pclose(pipe);
+    return out;
+}
+
 // The workbook as a spreadsheet reader sees it: each listed cell's formula and value.
 std::string ReadWorkbook(const std::string& path)
 {
@@ -225,16 +239,7 @@ for row in formulas.iter_rows():
             v = values[cell.coordinate].value
             print("%s|%s|%s" % (cell.coordinate, cell.value, v))
 )";
-    const std::string command = "/usr/bin/python3 -c '" + script + "' '" + path + "' 2>&1";
-    std::string out;
-    FILE* pipe = popen(command.c_str(), "r");
-    if (pipe == nullptr)
-        return out;
-    char buffer[4096];
-    while (std::size_t n = fread(buffer, 1, sizeof buffer, pipe))
-        out.append(buffer, n);
-    pclose(pipe);
-    return out;
+    return Shell("/usr/bin/python3 -c '" + script + "' '" + path + "'");
 }
 
 TEST_F(EstimateTest, WorkbookHasLiveFormulasWithTheirValues)
@@ -279,6 +284,44 @@ TEST_F(EstimateTest, WorkbookHasLiveFormulasWithTheirValues)
                                          : line;
         EXPECT_NE(cells.find(wanted + "\n"), std::string::npos) << cells;
     }
+}
+
+TEST_F(EstimateTest, WorkbookFormulasGiveTheTotalsInLibreOffice)
+{
+    if (std::system("command -v soffice >/dev/null 2>&1") != 0 ||
+        std::system("/usr/bin/python3 -c 'import openpyxl' >/dev/null 2>&1") != 0)
+        GTEST_SKIP() << "LibreOffice (soffice) or python3-openpyxl is not installed";
+    TempDir dir;
+    ASSERT_TRUE(metre::WriteEstimateWorkbook(dir.File("Devis.xlsx"), Build(), "€"));
+    // A copy without the computed values, and a profile that recalculates on load: the
+    // totals can then only come from the formulas.
+    Shell("/usr/bin/python3 -c 'import sys, openpyxl; openpyxl.load_workbook(sys.argv[1]).save(sys.argv[2])' '" +
+        dir.File("Devis.xlsx") + "' '" + dir.File("Formules.xlsx") + "'");
+    dir.Write("profile/user/registrymodifications.xcu",
+              "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n"
+              "<oor:items xmlns:oor=\"http://openoffice.org/2001/registry\" "
+              "xmlns:xs=\"http://www.w3.org/2001/XMLSchema\" xmlns:xsi=\"http://www.w3.org/2001/XMLSchema-instance\">\n"
+              "<item oor:path=\"/org.openoffice.Office.Calc/Formula/Load\"><prop oor:name=\"OOXMLRecalcMode\" "
+              "oor:op=\"fuse\"><value>0</value></prop></item>\n</oor:items>\n");
+    const std::string log = Shell("cd '" + dir.path.string() + "' && soffice -env:UserInstallation=file://" +
+                                dir.File("profile") + " --headless --convert-to csv Formules.xlsx");
+    const std::string csv = dir.Read("Formules.csv");
+    ASSERT_FALSE(csv.empty()) << log;
+    // Only the digits of each total line: the separators follow LibreOffice's locale.
+    const auto digitsOf = [&](const std::string& label) {
+        const std::size_t at = csv.find(label);
+        std::string digits;
+        if (at == std::string::npos)
+            return digits;
+        for (std::size_t i = at + label.size(); i < csv.size() && csv[i] != '\n'; ++i)
+            if (csv[i] >= '0' && csv[i] <= '9')
+                digits += csv[i];
+        return digits;
+    };
+    EXPECT_EQ(digitsOf("Total HT"), "994536") << csv;
+    EXPECT_EQ(digitsOf("TVA 5,5 %"), "006");
+    EXPECT_EQ(digitsOf("TVA 19,6 %"), "194909");
+    EXPECT_EQ(digitsOf("Total TTC"), "1189451");
 }
 
 class EstimateService : public EstimateTest {

@@ -44,6 +44,18 @@ fuzz: deps
 	$(FUZZ_BUILD)/bin/fuzz_dxf_reader -max_total_time=$(FUZZ_SECONDS) -max_len=32768 \
 	  -timeout=10 -rss_limit_mb=2048 $(FUZZ_BUILD)/corpus tests/data/dxf/fuzz tests/data/dxf
 
+# The example project end to end, on copies of its files in $(BUILD)/demo.
+demo: build
+	rm -rf $(BUILD)/demo && mkdir -p $(BUILD)/demo
+	cp examples/projet_vrd.dxf examples/VelaBordereau.xml $(BUILD)/demo/
+	cd $(BUILD)/demo && ../bin/velhost --modules ../modules --profile profil \
+	  --script ../../examples/demo.scr projet_vrd.dxf
+	@echo
+	@echo "Résultats de la démonstration, dans $(BUILD)/demo :"
+	@echo "  projet_vrd.dxf         le dessin, avec les quantités des réseaux EP et EU"
+	@echo "  VelaBordereau.xml      le bordereau des prix mis à jour (PVC 315 du réseau EP à 72,50 € HT)"
+	@echo "  VelaBordereau.xml.bak  le bordereau tel qu'il était avant le dernier enregistrement"
+
 bench: deps
 	cmake -S . -B build/bench -DCMAKE_BUILD_TYPE=Release -DVEL_BENCH=ON
 	cmake --build build/bench -j$(JOBS)

@@ -1,0 +1,47 @@
+#!/usr/bin/env python3
+"""Runs the shipped demo on copies of the example files and checks what it leaves.
+
+usage: run_demo.py VELHOST MODULES_DIR EXAMPLES_DIR WORK_DIR
+"""
+import os
+import shutil
+import subprocess
+import sys
+import xml.etree.ElementTree as ET
+
+
+def main():
+    velhost, modules, examples, work = (os.path.abspath(a) for a in sys.argv[1:5])
+    shutil.rmtree(work, ignore_errors=True)
+    os.makedirs(work)
+    for name in ("projet_vrd.dxf", "VelaBordereau.xml"):
+        shutil.copy(os.path.join(examples, name), work)
+    run = subprocess.run(
+        [velhost, "--modules", modules, "--profile", os.path.join(work, "profil"),
+         "--script", os.path.join(examples, "demo.scr"), "projet_vrd.dxf"],
+        cwd=work, capture_output=True, text=True, timeout=300)
+    output = run.stdout + run.stderr
+    failures = []
+    if run.returncode != 0:
+        failures.append(f"exit status {run.returncode}")
+    for text in ("Réseau EP, projet « EP Les Tilleuls »", "Réseau EU, projet « EU Les Tilleuls »",
+                 "Prix unitaire de « PVC 315 » : 72.50 € HT.", "Bordereau des prix enregistré.",
+                 "VelVuzazORE15 : VelaZodEVIBdrPrix", "Dessin enregistré"):
+        if text not in output:
+            failures.append(f"missing from the output: {text!r}")
+    schedule = ET.parse(os.path.join(work, "VelaBordereau.xml")).getroot()
+    prices = [a.get("unitPrice") for a in schedule.iter("article")
+              if a.get("quantityKey") == '"RSX_TUY_LIN_3D_PVC 315"' and a.get("groupKey") == "PRJ_RES(EP)"]
+    if prices != ["72.5"]:
+        failures.append(f"PVC 315 of EP priced {prices} in the written schedule")
+    if not os.path.exists(os.path.join(work, "VelaBordereau.xml.bak")):
+        failures.append("the previous schedule was not kept as .bak")
+    if failures:
+        print(output)
+        print("\n".join(failures))
+        return 1
+    return 0
+
+
+if __name__ == "__main__":
+    sys.exit(main())

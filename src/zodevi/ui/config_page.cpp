@@ -50,6 +50,9 @@ void DlgChildCfgUser::OnBrowse()
         acutPrintf("\n%s : ce fichier n'existe pas.", chosen.c_str());
         return;
     }
+    // A file dialog answers full paths; the parameter file must not depend on the
+    // folder the host was started from.
+    chosen = std::filesystem::absolute(chosen, error).lexically_normal().string();
     if (EqualsNoCase(chosen, m_strPath))
         return;
     // A file the schedule reader rejects cannot be chosen; the current schedule is not

@@ -162,7 +162,7 @@ std::string FormatPattern(std::string_view pattern, const std::vector<PatternArg
         // width or precision takes the next argument, bounded as well.
         std::size_t j = i + 1;
         std::size_t argIndex = next;
-        std::string spec = "%";
+        std::string conversion = "%";
         auto takeStar = [&](int limit) {
             long long v = 0;
             if (argIndex < args.size()) {
@@ -172,28 +172,28 @@ std::string FormatPattern(std::string_view pattern, const std::vector<PatternArg
                                                      : ParseInt(a.text).value_or(0);
             }
             ++argIndex;
-            spec += std::to_string(std::clamp<long long>(v, 0, limit));
+            conversion += std::to_string(std::clamp<long long>(v, 0, limit));
             ++j;
         };
         while (j < pattern.size() && std::string_view("-+ #0").find(pattern[j]) != std::string_view::npos)
-            spec += pattern[j++];
+            conversion += pattern[j++];
         if (j < pattern.size() && pattern[j] == '*') {
             takeStar(999);
         } else {
             std::size_t digits = 0;
             while (j < pattern.size() && pattern[j] >= '0' && pattern[j] <= '9' && digits < 3) {
-                spec += pattern[j++];
+                conversion += pattern[j++];
                 ++digits;
             }
         }
         if (j < pattern.size() && pattern[j] == '.') {
-            spec += pattern[j++];
+            conversion += pattern[j++];
             if (j < pattern.size() && pattern[j] == '*') {
                 takeStar(99);
             } else {
                 std::size_t digits = 0;
                 while (j < pattern.size() && pattern[j] >= '0' && pattern[j] <= '9' && digits < 2) {
-                    spec += pattern[j++];
+                    conversion += pattern[j++];
                     ++digits;
                 }
             }
@@ -204,7 +204,7 @@ std::string FormatPattern(std::string_view pattern, const std::vector<PatternArg
             ++i;
             continue;
         }
-        spec += conv;
+        conversion += conv;
         next = argIndex;
         const PatternArg* arg = next < args.size() ? &args[next] : nullptr;
         ++next;
@@ -214,14 +214,14 @@ std::string FormatPattern(std::string_view pattern, const std::vector<PatternArg
                 text = arg->kind == PatternArg::Kind::Text ? arg->text
                      : arg->kind == PatternArg::Kind::Real ? FormatRealShortest(arg->real)
                                                            : std::to_string(arg->integer);
-            out += FormatString(spec.c_str(), text.c_str());
+            out += FormatString(conversion.c_str(), text.c_str());
         } else if (conv == 'd' || conv == 'i' || conv == 'x') {
             long long v = 0;
             if (arg != nullptr)
                 v = arg->kind == PatternArg::Kind::Int ? arg->integer
                   : arg->kind == PatternArg::Kind::Real ? static_cast<long long>(arg->real)
                                                         : ParseInt(arg->text).value_or(0);
-            std::string llspec = spec;
+            std::string llspec = conversion;
             llspec.insert(llspec.size() - 1, "ll");
             out += FormatString(llspec.c_str(), v);
         } else {
@@ -230,7 +230,7 @@ std::string FormatPattern(std::string_view pattern, const std::vector<PatternArg
                 v = arg->kind == PatternArg::Kind::Real ? arg->real
                   : arg->kind == PatternArg::Kind::Int ? static_cast<double>(arg->integer)
                                                        : ParseReal(arg->text).value_or(0.0);
-            out += FormatString(spec.c_str(), v);
+            out += FormatString(conversion.c_str(), v);
         }
         i = j + 1;
     }

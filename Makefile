@@ -6,7 +6,7 @@ DEB_PACKAGES = cmake g++ clang lld make libgtest-dev libgmock-dev libbenchmark-d
                libpugixml-dev libxlsxwriter-dev libncurses-dev locales \
                python3-ezdxf python3-openpyxl libdxflib-dev libclang-rt-14-dev libedit-dev
 
-.PHONY: deps build test bench fuzz clean
+.PHONY: deps build test fuzz demo bench clean
 
 # Installs what is missing when run as root; otherwise only says what is missing.
 deps:

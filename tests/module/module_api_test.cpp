@@ -6,6 +6,7 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <functional>
 #include <filesystem>
 #include <limits>
 
@@ -186,6 +187,47 @@ TEST_F(ModuleApi, UnusualNamesAndValuesAreData)
     double price = 1;
     EXPECT_EQ(getPrice(&selector, &odd, &price, "EU %d"), kZodEVIOk);
     EXPECT_EQ(getPrice(&selector, &longName, &price, "EU %d"), kZodEVIOk);
+}
+
+TEST_F(ModuleApi, RoadAndEarthworkUpdatesAnswerWhetherTheyChangedSomething)
+{
+    auto* comb = Function<ZodEVI_UpdateBdrPgnFn>("ZodEVI_UpdateBdrPgn");
+    auto* materials = Function<ZodEVI_UpdateBdrMatFn>("ZodEVI_UpdateBdrMat");
+    auto* stripping = Function<ZodEVI_UpdateBdrEpDcpFn>("ZodEVI_UpdateBdrEpDcp");
+    auto* vegetation = Function<ZodEVI_UpdateBdrEpVegFn>("ZodEVI_UpdateBdrEpVeg");
+    auto* planing = Function<ZodEVI_UpdateBdrEpRbtFn>("ZodEVI_UpdateBdrEpRbt");
+    auto* depth = Function<ZodEVI_UpdateBdrTnePfFn>("ZodEVI_UpdateBdrTnePf");
+    const CZodEVIStringList combs{"PEHD 4x45"}, volumes{"Grave"}, surfaces{"Enrobé"}, lengths{"Bordure T2"};
+    const CZodEVIRealArray thicknesses{0.3}, limits{0.05, 0.1};
+    ASSERT_EQ(UpdateNetwork(1, "EU 1", {"PVC 200"}), kZodEVIOk);
+    const CZodEVIRealArray bounds{1.3, 2.0};
+    struct Case {
+        const char* name;
+        std::function<std::int32_t()> call;
+    };
+    const Case cases[] = {
+        {"comb ducts", [&] { return comb(&combs); }},
+        {"materials", [&] { return materials(&volumes, &surfaces, &lengths); }},
+        {"stripping", [&] { return stripping(&thicknesses); }},
+        {"vegetation", [&] { return vegetation(&thicknesses); }},
+        {"planing", [&] { return planing(&limits); }},
+        {"depth classes", [&] { return depth(&bounds); }},
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.name);
+        EXPECT_EQ(c.call(), kZodEVIOk);
+        EXPECT_EQ(c.call(), kZodEVIFailed); // the same again creates nothing
+    }
+}
+
+TEST_F(ModuleApi, ShowPriceSaysWhenNoArticleCountsTheItem)
+{
+    auto* show = Function<ZodEVI_ShowBdrPriceFn>("ZodEVI_ShowBdrPrice");
+    const std::int32_t selector = kZodEVIFittingCount;
+    const std::string item = "Regard inconnu";
+    EXPECT_EQ(show(&selector, &item, "EU 1"), kZodEVIFailed);
+    EXPECT_NE(session.Output().find("ERREUR : aucun article ne se réfère à l'élément !"), std::string::npos)
+        << session.Output();
 }
 
 TEST_F(ModuleApi, ServiceAndCommandsGoWithTheModule)

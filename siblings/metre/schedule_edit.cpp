@@ -4,7 +4,6 @@
 #include "text/text.hpp"
 
 #include <array>
-#include <climits>
 #include <cmath>
 #include <cstring>
 
@@ -44,19 +43,6 @@ bool SameArticle(const CZodEVIArticle& a, const CZodEVIArticle& b)
         if (!SameValue(a, b, field))
             return false;
     return true;
-}
-
-std::string FieldText(const CZodEVIArticle& article, const CZodEVIArticleField& field)
-{
-    switch (field.type) {
-    case CZodEVIArticleField::Type::Text:
-        return article.*field.text;
-    case CZodEVIArticleField::Type::Real:
-        return FormatRealShortest(article.*field.real);
-    case CZodEVIArticleField::Type::Int:
-        return FormatInt(article.*field.integer);
-    }
-    return {};
 }
 
 // The tree path with a new code, designation or nature, the category kept.
@@ -112,25 +98,8 @@ bool ScheduleEdit::SetEntryField(Entry& entry, const CZodEVIArticleField& field,
 {
     CZodEVIArticle& article = entry.article;
     const int previousNature = article.nature;
-    switch (field.type) {
-    case CZodEVIArticleField::Type::Text:
-        article.*field.text = value;
-        break;
-    case CZodEVIArticleField::Type::Real: {
-        const auto parsed = ParseReal(value);
-        if (!parsed)
-            return false;
-        article.*field.real = *parsed;
-        break;
-    }
-    case CZodEVIArticleField::Type::Int: {
-        const auto parsed = ParseInt(value);
-        if (!parsed || *parsed < INT_MIN || *parsed > INT_MAX)
-            return false;
-        article.*field.integer = static_cast<int>(*parsed);
-        break;
-    }
-    }
+    if (!SetFieldText(article, field, value))
+        return false;
     if (field.text == &CZodEVIArticle::treePath)
         entry.treePathSet = true;
     else if (!entry.treePathSet && (field.text == &CZodEVIArticle::code || field.text == &CZodEVIArticle::designation ||

@@ -72,45 +72,6 @@ const std::unordered_map<std::string_view, std::size_t>& FieldIndex()
     return index;
 }
 
-// Stores one attribute's text in its field; false when the text is no value of the
-// field's type.
-bool SetField(CZodEVIArticle& article, const CZodEVIArticleField& field, const char* text)
-{
-    switch (field.type) {
-    case CZodEVIArticleField::Type::Text:
-        article.*field.text = text;
-        return true;
-    case CZodEVIArticleField::Type::Real: {
-        const auto value = ParseReal(text);
-        if (!value)
-            return false;
-        article.*field.real = *value;
-        return true;
-    }
-    case CZodEVIArticleField::Type::Int: {
-        const auto value = ParseInt(text);
-        if (!value || *value < INT_MIN || *value > INT_MAX)
-            return false;
-        article.*field.integer = static_cast<int>(*value);
-        return true;
-    }
-    }
-    return false;
-}
-
-std::string FieldText(const CZodEVIArticle& article, const CZodEVIArticleField& field)
-{
-    switch (field.type) {
-    case CZodEVIArticleField::Type::Text:
-        return article.*field.text;
-    case CZodEVIArticleField::Type::Real:
-        return FormatRealShortest(article.*field.real);
-    case CZodEVIArticleField::Type::Int:
-        return FormatInt(article.*field.integer);
-    }
-    return {};
-}
-
 struct StringWriter : pugi::xml_writer {
     std::string out;
     void write(const void* data, std::size_t size) override { out.append(static_cast<const char*>(data), size); }
@@ -178,6 +139,44 @@ void SyncFolderOf(const std::string& path)
 
 } // namespace
 
+bool SetFieldText(CZodEVIArticle& article, const CZodEVIArticleField& field, std::string_view text)
+{
+    switch (field.type) {
+    case CZodEVIArticleField::Type::Text:
+        article.*field.text = std::string(text);
+        return true;
+    case CZodEVIArticleField::Type::Real: {
+        const auto value = ParseReal(text);
+        if (!value)
+            return false;
+        article.*field.real = *value;
+        return true;
+    }
+    case CZodEVIArticleField::Type::Int: {
+        const auto value = ParseInt(text);
+        if (!value || *value < INT_MIN || *value > INT_MAX)
+            return false;
+        article.*field.integer = static_cast<int>(*value);
+        return true;
+    }
+    }
+    return false;
+}
+
+std::string FieldText(const CZodEVIArticle& article, const CZodEVIArticleField& field)
+{
+    switch (field.type) {
+    case CZodEVIArticleField::Type::Text:
+        return article.*field.text;
+    case CZodEVIArticleField::Type::Real:
+        return FormatRealShortest(article.*field.real);
+    case CZodEVIArticleField::Type::Int:
+        return FormatInt(article.*field.integer);
+    }
+    return {};
+}
+
+
 FileResult ReadScheduleText(std::string_view text, const std::string& name, ArticleVector& out)
 {
     pugi::xml_document document;
@@ -221,7 +220,7 @@ FileResult ReadScheduleText(std::string_view text, const std::string& name, Arti
                 return FileResult::Failure(FormatString("Bordereau « %s », ligne %d : article %zu, champ « %s » en double.",
                                                         name.c_str(), lineOf(), read.size() + 1, attribute.name()));
             seen |= std::uint64_t{1} << position;
-            if (!SetField(*article, fields[position], attribute.value()))
+            if (!SetFieldText(*article, fields[position], attribute.value()))
                 return FileResult::Failure(FormatString(
                     "Bordereau « %s », ligne %d : article %zu, champ « %s » : %s attendu, « %s » trouvé.", name.c_str(),
                     lineOf(), read.size() + 1, attribute.name(),

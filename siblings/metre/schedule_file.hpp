@@ -12,6 +12,11 @@
 
 namespace metre {
 
+// One field as text (reals in the shortest form that reads back equal), and back; the
+// reading answers false, leaving the field alone, when the text is no value of its type.
+std::string FieldText(const CZodEVIArticle& article, const CZodEVIArticleField& field);
+bool SetFieldText(CZodEVIArticle& article, const CZodEVIArticleField& field, std::string_view text);
+
 using ArticleVector = std::vector<std::unique_ptr<CZodEVIArticle>>;
 
 // Outcome of a read or a write: on failure, one French line naming the file, the line

@@ -14,6 +14,23 @@ import subprocess
 import sys
 
 
+def missing_texts(output, expected):
+    """The texts of the file EXPECTED that the output lacks, in order, as messages."""
+    failures = []
+    position = 0
+    with open(expected, encoding="utf-8") as f:
+        for line in f:
+            text = line.rstrip("\n")
+            if not text or text.startswith("#"):
+                continue
+            found = output.find(text, position)
+            if found < 0:
+                failures.append(f"not found after offset {position}: {text!r}")
+                continue
+            position = found + len(text)
+    return failures
+
+
 def main():
     velhost, script, modules, work = (os.path.abspath(a) for a in sys.argv[1:5])
     status, expected = sys.argv[5:7]
@@ -27,17 +44,7 @@ def main():
     failures = []
     if run.returncode != int(status):
         failures.append(f"exit status {run.returncode}, expected {status}")
-    position = 0
-    with open(expected, encoding="utf-8") as f:
-        for line in f:
-            text = line.rstrip("\n")
-            if not text or text.startswith("#"):
-                continue
-            found = output.find(text, position)
-            if found < 0:
-                failures.append(f"not found after offset {position}: {text!r}")
-                continue
-            position = found + len(text)
+    failures += missing_texts(output, expected)
     if failures:
         print(output)
         print("\n".join(failures))

@@ -13,6 +13,9 @@ import subprocess
 import sys
 import xml.etree.ElementTree as ET
 
+sys.path.insert(0, os.path.join(os.path.dirname(os.path.abspath(__file__)), "..", "apps"))
+from run_script import missing_texts  # noqa: E402
+
 
 def main():
     velhost, modules, examples, work, script, expected = (os.path.abspath(a) for a in sys.argv[1:7])
@@ -29,17 +32,7 @@ def main():
     failures = []
     if run.returncode != 0:
         failures.append(f"exit status {run.returncode}")
-    position = 0
-    with open(expected, encoding="utf-8") as f:
-        for line in f:
-            text = line.rstrip("\n")
-            if not text or text.startswith("#"):
-                continue
-            found = output.find(text, position)
-            if found < 0:
-                failures.append(f"not found after offset {position}: {text!r}")
-                continue
-            position = found + len(text)
+    failures += missing_texts(output, expected)
     articles = {a.get("treePath"): a for a in
                 ET.parse(os.path.join(work, "VelaBordereau.xml")).getroot().iter("article")}
     i = 0

@@ -1,31 +1,14 @@
-// Reading project quantity records (XData of application "DAZUVUVUD") and keeping the
-// metre module's estimate records in an XRECORD dictionary of the drawing.
+// Reading the projects' quantity records with the reading shared by every module, and
+// keeping the metre module's estimate records in an XRECORD dictionary of the drawing.
 #include "drawing_records.hpp"
 
 #include "text/text.hpp"
 #include "velhost/dbase.h"
 #include "velhost/resbuf.h"
 
-#include <cstring>
-
 namespace metre {
 
 namespace {
-
-struct ProjectGroup {
-    int kind;
-    const char* first;
-    const char* second;
-};
-
-constexpr ProjectGroup kGroups[] = {
-    {3, "VELANTO_RSX_VRD", "PROJECTS"},
-    {2, "VELANTO_ROUT2_DICT", "VELANTO_ROUT2_PROJ"},
-    {4, "KORVANE", "KORVANE_PROJET"},
-    {1, "VELANTO_PFM_VRD", "PROJECTS"},
-};
-
-constexpr const char* kProjectApp = "DAZUVUVUD";
 
 // Closes an opened object on every way out.
 struct Closer {
@@ -36,65 +19,6 @@ struct Closer {
             object->close();
     }
 };
-
-double QuantityOf(const resbuf* item)
-{
-    switch (item->restype) {
-    case kXdAsciiString: {
-        // The leading numeric part of the text, as the drawing's writers intend.
-        const char* text = item->resval.rstring ? item->resval.rstring : "";
-        std::size_t end = std::strspn(text, " \t");
-        const std::size_t start = end;
-        if (text[end] == '+' || text[end] == '-')
-            ++end;
-        end += std::strspn(text + end, "0123456789");
-        if (text[end] == '.')
-            end += 1 + std::strspn(text + end + 1, "0123456789");
-        for (std::size_t stop = end; stop > start; --stop)
-            if (const auto value = ParseReal(std::string_view(text + start, stop - start)))
-                return *value;
-        return 0;
-    }
-    case kXdReal:
-    case kXdDist:
-    case kXdScale:
-        return item->resval.rreal;
-    case kXdInteger16:
-        return item->resval.rint;
-    case kXdInteger32:
-        return item->resval.rlong;
-    default:
-        return 0;
-    }
-}
-
-// The project's name and quantities from its record; false when the head is malformed.
-bool ReadRecord(const resbuf* list, std::string& name, QuantityList& quantities)
-{
-    const resbuf* item = list ? list->rbnext : nullptr;
-    if (item == nullptr || item->restype != kXdAsciiString || velRbText(item) != "PRJ_NOM")
-        return false;
-    item = item->rbnext;
-    if (item == nullptr || item->restype != kXdAsciiString)
-        return false;
-    name = velRbText(item);
-    for (item = item->rbnext; item != nullptr && item->restype == kXdAsciiString; item = item->rbnext) {
-        const std::string key = velRbText(item);
-        item = item->rbnext;
-        if (item == nullptr)
-            break;
-        const double quantity = QuantityOf(item);
-        bool replaced = false;
-        for (auto& entry : quantities)
-            if (entry.first == key) {
-                entry.second = quantity;
-                replaced = true;
-            }
-        if (!replaced)
-            quantities.emplace_back(key, quantity);
-    }
-    return true;
-}
 
 resbuf* EstimateData(const EstimateRecord& record)
 {
@@ -117,7 +41,7 @@ ProjectTables ProjectTables::Read(AcDbDatabase& database)
     if (database.getNamedObjectsDictionary(named, AcDb::kForRead) != Acad::eOk)
         return tables;
     Closer namedCloser{named};
-    for (const ProjectGroup& group : kGroups) {
+    for (const velproj::ProjectGroupPlace& group : velproj::kProjectGroups) {
         AcDbObject* firstObject = nullptr;
         if (named->getAt(group.first, firstObject, AcDb::kForRead) != Acad::eOk)
             continue;
@@ -136,17 +60,17 @@ ProjectTables ProjectTables::Read(AcDbDatabase& database)
             if (it->getObject(entry, AcDb::kForRead) != Acad::eOk)
                 continue;
             Closer entryCloser{entry};
-            VelRbPtr data(entry->xData(kProjectApp));
+            VelRbPtr data(entry->xData(velproj::kRecordApp));
             std::string name;
-            QuantityList quantities;
-            if (data && ReadRecord(data.get(), name, quantities))
+            velproj::QuantityTable quantities;
+            if (data && velproj::ReadProjectRecord(data.get(), name, quantities))
                 tables.Add(group.kind, name, std::move(quantities));
         }
     }
     return tables;
 }
 
-void ProjectTables::Add(int projectKind, const std::string& project, QuantityList quantities)
+void ProjectTables::Add(int projectKind, const std::string& project, velproj::QuantityTable quantities)
 {
     tables_[projectKind][project] = std::move(quantities);
 }
@@ -161,7 +85,7 @@ std::optional<int> ProjectTables::KindHolding(int projectKind, const std::string
 {
     if (HasProject(projectKind, project))
         return projectKind;
-    for (int kind : {1, 2, 4, 3})
+    for (int kind : {velproj::kKindPlatform, velproj::kKindRoad, velproj::kKindKorvane, velproj::kKindNetwork})
         if (HasProject(kind, project))
             return kind;
     return std::nullopt;
@@ -175,13 +99,11 @@ std::optional<double> ProjectTables::Quantity(int projectKind, const std::string
     const auto found = kind->second.find(project);
     if (found == kind->second.end())
         return std::nullopt;
-    for (const auto& entry : found->second)
-        if (entry.first == key)
-            return entry.second;
-    for (const auto& entry : found->second)
-        if (EqualsNoCase(entry.first, key))
-            return entry.second;
-    return std::nullopt;
+    std::optional<double> quantity;
+    for (const auto& [entryKey, value] : found->second.Entries())
+        if (EqualsNoCase(entryKey, key))
+            quantity = value;
+    return quantity;
 }
 
 bool RecordEstimate(AcDbDatabase& database, const EstimateRecord& record, std::string& error)

@@ -3,39 +3,40 @@
 // the estimates made from the drawing.
 #pragma once
 
+#include "velsiblings/project_records.h"
+
 #include <map>
 #include <optional>
 #include <string>
-#include <utility>
 #include <vector>
 
 class AcDbDatabase;
 
 namespace metre {
 
-// Quantities of one project, in the record's order; a key met twice keeps its last value.
-using QuantityList = std::vector<std::pair<std::string, double>>;
-
 // Every project of the drawing by kind (1 platform, 2 road, 3 network, 4 Korvane), then
-// by name; the record met last in a dictionary's sorted walk wins a repeated name.
+// by name, read as the module's project discovery reads them: the record met last in a
+// dictionary's sorted walk wins a repeated name within its kind.
 class ProjectTables {
 public:
     // Reads the four project dictionaries; a missing one leaves its kind empty.
     static ProjectTables Read(AcDbDatabase& database);
 
-    // The quantity of a key in a project, compared exactly first and then without regard
-    // to case; nullopt when the project or the key is missing.
+    // The quantity of a key in a project of that kind, the key compared without regard to
+    // case. Of keys that differ only by case the last in the table counts, as in the
+    // module's article filter, where each matching key replaces the one before. nullopt
+    // when the project or the key is missing.
     std::optional<double> Quantity(int projectKind, const std::string& project, const std::string& key) const;
     bool HasProject(int projectKind, const std::string& project) const;
     // The kind under which the project is found: the given one first, then the others
-    // (a line summing several projects carries the kind of only one of them); nullopt
-    // when no kind has it.
+    // (an older line summing several projects carries the kind of only one of them);
+    // nullopt when no kind has it.
     std::optional<int> KindHolding(int projectKind, const std::string& project) const;
 
-    void Add(int projectKind, const std::string& project, QuantityList quantities);
+    void Add(int projectKind, const std::string& project, velproj::QuantityTable quantities);
 
 private:
-    std::map<int, std::map<std::string, QuantityList>> tables_;
+    std::map<int, std::map<std::string, velproj::QuantityTable>> tables_;
 };
 
 // Dictionary of the named-object dictionary where the estimates are recorded.

@@ -9,6 +9,7 @@
 #include "velhost/editor.h"
 #include "velhost/profile.h"
 
+#include <ctime>
 #include <filesystem>
 
 namespace metre {
@@ -29,9 +30,15 @@ bool IsFileName(const std::string& name)
     return !name.empty() && name != "." && name != ".." && name.find_first_of("/\\:*?\"<>|\r\n") == std::string::npos;
 }
 
-std::string Money(double value)
+// Today as "06/12/2026".
+std::string Today()
 {
-    return FrenchNumber(value, 2);
+    const std::time_t now = std::time(nullptr);
+    std::tm local{};
+    char text[16] = "";
+    if (localtime_r(&now, &local) != nullptr)
+        std::strftime(text, sizeof text, "%d/%m/%Y", &local);
+    return text;
 }
 
 } // namespace
@@ -117,6 +124,7 @@ int ShowEstimate(const std::string& name, const std::vector<CZodEVIAssocLine*>* 
     const ProjectTables projects = ProjectTables::Read(*database);
     Estimate estimate = BuildEstimate(name, lines ? *lines : std::vector<CZodEVIAssocLine*>(), projects, schedule);
     estimate.drawing = drawing.empty() ? document->docTitle() : drawing;
+    estimate.date = Today();
 
     const std::string currency = CurrencySymbol();
     const std::string workbook = (folder / (name + ".xlsx")).string();
@@ -133,16 +141,8 @@ int ShowEstimate(const std::string& name, const std::vector<CZodEVIAssocLine*>* 
                                 estimate.totalInclTax};
     const bool recorded = RecordEstimate(*database, record, error);
 
-    acutPrintf("Devis « %s » : %zu ligne(s) en %zu chapitre(s).\n", name.c_str(), estimate.RowCount(),
-               estimate.chapters.size());
-    acutPrintf("  Total HT  : %s %s\n", Money(estimate.totalExclTax).c_str(), currency.c_str());
-    for (const EstimateTax& tax : estimate.taxes)
-        acutPrintf("  TVA %s %% : %s %s\n", FrenchNumber(tax.rate, -1).c_str(), Money(tax.tax).c_str(),
-                   currency.c_str());
-    acutPrintf("  Total TTC : %s %s\n", Money(estimate.totalInclTax).c_str(), currency.c_str());
-    acutPrintf("  Fichiers : %s et %s\n", workbook.c_str(), csv.c_str());
-    for (const std::string& warning : estimate.warnings)
-        acutPrintf("  Attention : %s\n", warning.c_str());
+    for (const std::string& line : EstimateSummary(estimate, currency, workbook, csv))
+        acutPrintf("%s\n", line.c_str());
     if (!recorded) {
         acutPrintf("%s\n", error.c_str());
         return 1;

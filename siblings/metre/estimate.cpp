@@ -83,20 +83,41 @@ std::vector<CZodEVILineProject> ProjectsOfLine(const CZodEVIAssocLine& line, con
     return pairs;
 }
 
-// The line's quantity in each of its projects.
-std::vector<QuantitySource> LineSources(const CZodEVIAssocLine& line, const ProjectTables& projects)
+// The network of an article's group key PRJ_RES(name): the text up to the key's last ")";
+// empty for an article of no network.
+std::string NetworkOfArticle(const CZodEVIArticle* article)
+{
+    static constexpr std::string_view kOpen = "PRJ_RES(";
+    if (article == nullptr)
+        return {};
+    const std::size_t open = article->groupKey.find(kOpen);
+    const std::size_t close = article->groupKey.rfind(')');
+    if (open == std::string::npos || close == std::string::npos || close < open + kOpen.size())
+        return {};
+    return article->groupKey.substr(open + kOpen.size(), close - open - kOpen.size());
+}
+
+// The line's quantity in each of its projects. A non-graphic article of a network counts 1
+// under the network's name even where a project of that name records its key: the dialog
+// files the network's lump sums after the projects' quantities, and the later one wins.
+std::vector<QuantitySource> LineSources(const CZodEVIAssocLine& line, const ProjectTables& projects,
+                                        const std::string& network)
 {
     using Origin = QuantitySource::Origin;
     std::vector<QuantitySource> sources;
     for (CZodEVILineProject& pair : ProjectsOfLine(line, projects)) {
         QuantitySource source{std::move(pair.name), pair.kind, 0, Origin::MissingProject};
+        const bool networkLumpSum = line.lineKind == kLineKindLumpSum && source.kind == kProjectNetwork;
         if (IsPseudoProject(source.project)) {
             source.quantity = 1.0;
             source.origin = Origin::Pseudo;
+        } else if (networkLumpSum && !network.empty() && source.project == network) {
+            source.quantity = 1.0;
+            source.origin = Origin::NetworkLumpSum;
         } else if (const auto quantity = projects.Quantity(source.kind, source.project, line.quantityKey)) {
             source.quantity = *quantity;
             source.origin = Origin::Drawing;
-        } else if (line.lineKind == kLineKindLumpSum && source.kind == kProjectNetwork) {
+        } else if (networkLumpSum) {
             source.quantity = 1.0;
             source.origin = Origin::NetworkLumpSum;
         } else if (projects.HasProject(source.kind, source.project)) {
@@ -347,7 +368,7 @@ Estimate BuildEstimate(const std::string& name, const std::vector<CZodEVIAssocLi
             estimate.warnings.push_back(FormatString("« %s » : %s.", line->label.c_str(), check.c_str()));
             row.checks.push_back(check);
         }
-        row.sources = LineSources(*line, projects);
+        row.sources = LineSources(*line, projects, NetworkOfArticle(article));
         double quantity = 0;
         for (const QuantitySource& source : row.sources) {
             quantity += source.quantity;

@@ -103,6 +103,8 @@ protected:
             a->code = code;
             a->treePath = path;
             a->taxRate = rate;
+            if (path == kPipePath)
+                a->groupKey = "PRJ_RES(EU1)";
             schedule.push_back(std::move(a));
         }
     }
@@ -213,6 +215,7 @@ TEST_F(EstimateTest, LineQuantitiesFollowTheirProjectsAndKinds)
         std::string assocText1;
         double quantity;
         const char* check; // expected among the line's checks, or ""
+        const std::string* treePath = &kPavingPath;
     };
     const Case cases[] = {
         {"one name in two groups", 3, "\"PRJ_SFC\"", "Parking,Parking", 1, parkings, 7.5, ""},
@@ -231,10 +234,12 @@ TEST_F(EstimateTest, LineQuantitiesFollowTheirProjectsAndKinds)
          EncodeLineProjects({{"Route B", 1}}), 0, "projet « Route B » absent du dessin"},
         {"an unreadable project list falls back on the names", 3, "\"PRJ_SFC\"", "Parking", 2, "x", 3.0, ""},
         {"**Forfait", 5, "\"\"", "**Forfait", 0, EncodeLineProjects({{"**Forfait", 0}}), 1, "sans unité"},
+        {"a network's lump sum under a project named as the network", 5, "\"RSX_TUY_NB_Regard\"", "EU1", 3,
+         EncodeLineProjects({{"EU1", 3}}), 1, "", &kPipePath},
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.what);
-        lines = {Line(c.what, c.lineKind, c.key, c.projects, c.projectKind, kPavingPath, "", 2)};
+        lines = {Line(c.what, c.lineKind, c.key, c.projects, c.projectKind, *c.treePath, "", 2)};
         lines[0].assocText1 = c.assocText1;
         const metre::Estimate estimate = Build();
         ASSERT_EQ(estimate.RowCount(), 1u);

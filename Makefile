@@ -4,7 +4,8 @@ ASAN_BUILD ?= build/asan
 JOBS       ?= 2
 DEB_PACKAGES = cmake g++ clang lld make libgtest-dev libgmock-dev libbenchmark-dev \
                libpugixml-dev libxlsxwriter-dev libncurses-dev locales \
-               python3-ezdxf python3-openpyxl libdxflib-dev libclang-rt-14-dev libedit-dev
+               python3-ezdxf python3-openpyxl libdxflib-dev libclang-rt-14-dev libedit-dev \
+               tmux nano
 
 .PHONY: deps build test fuzz demo bench clean
 
@@ -19,8 +20,11 @@ deps:
 	    apt-get update -qq && DEBIAN_FRONTEND=noninteractive apt-get install -y -qq $$missing; \
 	  else echo "Paquets manquants (à installer en root) :$$missing"; fi; \
 	fi
-	@if [ "$$(id -u)" = 0 ] && ! locale -a 2>/dev/null | grep -qi '^fr_FR.utf-\?8$$'; then \
-	  sed -i 's/^# *fr_FR.UTF-8 UTF-8/fr_FR.UTF-8 UTF-8/' /etc/locale.gen && locale-gen >/dev/null; \
+	@# The terminal tests run velhost under a UTF-8 and a Latin-1 French locale.
+	@if [ "$$(id -u)" = 0 ] && ! { locale -a 2>/dev/null | grep -qi '^fr_FR.utf-\?8$$' && \
+	    locale -a 2>/dev/null | grep -qi '^fr_FR.iso-\?8859-\?1$$'; }; then \
+	  sed -i -e 's/^# *fr_FR.UTF-8 UTF-8/fr_FR.UTF-8 UTF-8/' -e 's/^# *fr_FR ISO-8859-1/fr_FR ISO-8859-1/' \
+	    /etc/locale.gen && locale-gen >/dev/null; \
 	fi
 
 build: deps

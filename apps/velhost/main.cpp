@@ -26,6 +26,46 @@ constexpr const char* kUsage =
     "usage : velhost [--script FICHIER] [--load MODULE]... [--modules DOSSIER] "
     "[--profile DOSSIER] [DESSIN]\n";
 
+constexpr const char* kHelp =
+    "\n"
+    "Ouvre le dessin DXF (un dessin vide sans DESSIN), puis exécute les commandes tapées à\n"
+    "l'invite « Commande: » ou lues dans un script.\n"
+    "\n"
+    "Options :\n"
+    "  --script FICHIER   exécute les lignes du script (.scr) au lieu du clavier, puis se\n"
+    "                     termine ; la première ligne en échec l'arrête\n"
+    "  --load MODULE      charge MODULE (MODULE.arx) au démarrage ; l'option se répète\n"
+    "  --modules DOSSIER  dossier des modules (par défaut, « modules » à côté du programme)\n"
+    "  --profile DOSSIER  dossier du profil : paramètres, registre et historique des\n"
+    "                     commandes (par défaut $XDG_CONFIG_HOME/velhost, sinon\n"
+    "                     ~/.config/velhost)\n"
+    "  -h, --help         affiche cette aide\n"
+    "\n"
+    "Commandes de l'hôte : OPEN, NEW, SAVE, SAVEAS, CLOSE, DOCUMENT, APPLOAD, ARX, SETVAR,\n"
+    "GETVAR, QUIT ; puis celles des modules chargés (APPLOAD VelVuzazORE15, puis\n"
+    "VelVuzazORE15 pour la liste des commandes du métré). Les réponses peuvent suivre la\n"
+    "commande sur la même ligne : « SETVAR OSMODE 33 ».\n"
+    "\n"
+    "Au clavier :\n"
+    "  Entrée             valide la réponse ; une réponse vide prend la valeur entre < >\n"
+    "  Oui, Non...        une option se tape en entier ou par son début (« o », « Déc »)\n"
+    "  Ctrl-C             annule la question en cours ; l'hôte continue\n"
+    "  Ctrl-D             sur une ligne vide, à l'invite « Commande: », termine comme QUIT\n"
+    "                     (les dessins modifiés sont proposés à l'enregistrement) ;\n"
+    "                     ailleurs, annule la question\n"
+    "  Haut, Bas, Ctrl-R  rappellent les lignes déjà tapées, gardées d'une session à l'autre\n"
+    "                     dans le fichier « historique » du profil\n"
+    "  Ctrl-A, Ctrl-E     début, fin de la ligne (édition à la manière d'Emacs)\n"
+    "  Un message attend Entrée, qui choisit son bouton [OK] ou celui entre < > ; pour un\n"
+    "  autre bouton, tapez son nom ou sa première lettre.\n"
+    "\n"
+    "ZodEVIBdrPrix ouvre le bordereau dans l'éditeur de $VISUAL, sinon $EDITOR (à défaut\n"
+    "sensible-editor, nano ou vi) : enregistrez et quittez pour valider.\n"
+    "\n"
+    "Code de retour : 0 ; 1 quand le dessin ou un module de --load ne s'ouvre pas, ou\n"
+    "après une ligne de script en échec ; 2 pour une option ou un script illisible ; 3\n"
+    "après un arrêt fatal d'un module.\n";
+
 struct Options {
   std::string script;
   std::vector<std::string> modules;
@@ -93,6 +133,7 @@ int main(int argc, char** argv) {
 
   if (options.help) {
     std::fputs(kUsage, stdout);
+    std::fputs(kHelp, stdout);
     return 0;
   }
 
@@ -122,11 +163,20 @@ int main(int argc, char** argv) {
     ui = std::make_unique<VelScriptedUI>(std::cin, std::cout, "<entrée standard>");
   }
   velSetUI(ui.get());
+  auto saveHistory = [&] {
+    if (terminal == nullptr) return;
+    std::error_code ec;
+    fs::create_directories(settings.profileDir, ec);
+    if (!terminal->saveHistory(historyFile))
+      std::fprintf(stderr, "velhost : impossible d'écrire l'historique %s.\n", historyFile.c_str());
+  };
 
   // A fatal error ends the process at once: modules are in an unknown state, so none of
-  // their code runs again (no unload, no static destructors).
+  // their code runs again (no unload, no static destructors). The lines typed so far are
+  // kept: they are what the user needs to run again.
   auto* script = dynamic_cast<VelScriptedUI*>(ui.get());
-  velSetAbortHandler([script](const std::string& message) {
+  velSetAbortHandler([script, &saveHistory](const std::string& message) {
+    saveHistory();
     std::fflush(stdout);
     if (script != nullptr)
       std::fprintf(stderr, "velhost: %s, ligne %d : arrêt fatal : %s\n", script->scriptName().c_str(),
@@ -156,12 +206,7 @@ int main(int argc, char** argv) {
     }
   }
   status = shell.run();
-  if (terminal != nullptr) {
-    std::error_code ec;
-    fs::create_directories(settings.profileDir, ec);
-    if (!terminal->saveHistory(historyFile))
-      std::fprintf(stderr, "velhost : impossible d'écrire l'historique %s.\n", historyFile.c_str());
-  }
+  saveHistory();
   velSetUI(nullptr);
   return status;
 }

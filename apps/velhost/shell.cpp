@@ -263,9 +263,13 @@ int VelShell::run() {
   for (;;) {
     std::optional<VelInputLine> line = ui.readLine("\nCommande: ");
     if (!line) {
-      if (ui.inputEnded()) {
-        if (script == nullptr) acutPrintf("\n");
-        break;
+      if (ui.inputEnded()) break;
+      if (ui.endRequested()) {
+        // Ctrl-D ends the session as QUIT does, asking about unsaved drawings.
+        std::string error;
+        if (runLine("QUIT", error) == VelLineResult::kQuit) break;
+        acutPrintf("%s\n", error.c_str());
+        continue;
       }
       acutPrintf("*Annulé*\n");
       continue;

@@ -1,6 +1,7 @@
 // A sibling module of the example project (VelDemoPrix.arx): how a road or network
 // module prices an article through the schedule's service API. Its command asks for a
 // quantity and a unit price, sets the price, and stores the schedule.
+#include <optional>
 #include <string>
 
 #include "text/text.hpp"
@@ -39,11 +40,18 @@ void SetPriceCommand()
         return;
     }
     std::string selectorText, item, network, priceText;
-    if (!Ask("\nQuantité (0 tuyaux, 6 regards, 9 à 12 matériaux) <0> : ", selectorText) ||
-        !Ask("\nNom de l'élément : ", item) || !Ask("\nRéseau (vide : réseau général) : ", network) ||
+    if (!Ask("\nQuantité (0 tuyaux, 6 regards, 9 à 12 matériaux) <0> : ", selectorText))
+        return;
+    // Said at once rather than after three more questions.
+    const std::optional<long long> quantity = selectorText.empty() ? 0 : ParseInt(selectorText);
+    if (!quantity || *quantity < 0 || *quantity > 12) {
+        acutPrintf("\n« %s » n'est pas une quantité : tapez un nombre de 0 à 12.\n", selectorText.c_str());
+        return;
+    }
+    const std::int32_t selector = static_cast<std::int32_t>(*quantity);
+    if (!Ask("\nNom de l'élément : ", item) || !Ask("\nRéseau (vide : réseau général) : ", network) ||
         !Ask("\nPrix unitaire HT : ", priceText))
         return;
-    const std::int32_t selector = selectorText.empty() ? 0 : static_cast<std::int32_t>(ParseInt(selectorText).value_or(-1));
     // Prices are typed the French way as often as not.
     for (char& c : priceText)
         if (c == ',')

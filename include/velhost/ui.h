@@ -69,6 +69,9 @@ class VelUserInterface {
   // True once the input has ended (a readLine answering nullopt then means "no more
   // input" rather than a cancelled prompt).
   bool inputEnded() const { return ended_; }
+  // True when the last readLine answered nullopt because the user asked to end (Ctrl-D
+  // on an empty line in a terminal); later prompts still read.
+  bool endRequested() const { return endRequested_; }
   // Words given on the command line after a command name: the next prompts take them
   // first, as a script does.
   void pushPendingInput(const std::vector<std::string>& words);
@@ -78,15 +81,20 @@ class VelUserInterface {
  protected:
   virtual std::optional<VelInputLine> readRawLine(const std::string& prompt) = 0;
   bool ended_ = false;
+  bool endRequested_ = false;
 
  private:
   std::deque<std::string> pending_;
 };
 
 // Interactive use: standard output, line editing with history when the input is a
-// terminal, message boxes asked on the command line.
+// terminal, message boxes asked on the command line. With line editing, Ctrl-C cancels
+// the prompt (and is ignored between prompts, so that it never ends the host), and
+// Ctrl-D on an empty line answers nullopt with endRequested().
 class VelTerminalUI : public VelUserInterface {
  public:
+  // lineEditing: the line editor on the process's standard input and output (which must
+  // be a terminal); in and out serve otherwise.
   VelTerminalUI(std::istream& in, std::ostream& out, bool lineEditing);
   ~VelTerminalUI() override;
   void print(const std::string& text) override;
@@ -100,9 +108,26 @@ class VelTerminalUI : public VelUserInterface {
   std::optional<VelInputLine> readRawLine(const std::string& prompt) override;
 
  private:
+  class LineEditor;
   std::istream& in_;
   std::ostream& out_;
-  bool lineEditing_;
+  std::unique_ptr<LineEditor> editor_;
+};
+
+// Makes the character type UTF-8 for its lifetime: the user's locale when it is UTF-8,
+// else C.UTF-8, restoring the previous one after. Terminal libraries need it to show and
+// read accented text; numbers stay locale-free (LC_NUMERIC is never touched).
+class VelUtf8CharacterType {
+ public:
+  VelUtf8CharacterType();
+  ~VelUtf8CharacterType();
+  VelUtf8CharacterType(const VelUtf8CharacterType&) = delete;
+  VelUtf8CharacterType& operator=(const VelUtf8CharacterType&) = delete;
+  // The UTF-8 locale chosen ("" when the system has none).
+  static const std::string& localeName();
+
+ private:
+  std::string previous_;
 };
 
 // A command script (".scr"): each line is what the user would type; a prompt takes the
@@ -131,6 +156,11 @@ class VelScriptedUI : public VelUserInterface {
 
 // The script line without its comment, or nullopt for a line that is only a comment.
 std::optional<std::string> velStripScriptComment(const std::string& line);
+
+// The environment ("NAME=value" entries) for a terminal program the host starts, such as
+// a text editor: the process's own, with a UTF-8 character type when the user's locale
+// is not UTF-8, so that the program shows and writes the host's UTF-8 text as it is.
+std::vector<std::string> velTerminalProgramEnvironment();
 
 // The back-end in use (a terminal on standard input/output until one is installed).
 VelUserInterface& velUI();

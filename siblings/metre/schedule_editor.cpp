@@ -85,13 +85,20 @@ bool RunTextEditor(const std::string& file, int line, std::string& error)
     // argument, never inside the command.
     const std::string script = command + " \"$@\"";
     const std::string position = FormatString("+%d", line);
+    // The table is UTF-8: the editor must read and write it so, whatever the user's locale.
+    const std::vector<std::string> environment = velTerminalProgramEnvironment();
+    std::vector<char*> envp;
+    for (const std::string& entry : environment)
+        envp.push_back(const_cast<char*>(entry.c_str()));
+    envp.push_back(nullptr);
+    const char* const argv[] = {"sh", "-c", script.c_str(), "sh", position.c_str(), file.c_str(), nullptr};
     const pid_t child = ::fork();
     if (child < 0) {
         error = FormatString("impossible de lancer l'éditeur « %s » (%s)", command.c_str(), std::strerror(errno));
         return false;
     }
     if (child == 0) {
-        ::execl("/bin/sh", "sh", "-c", script.c_str(), "sh", position.c_str(), file.c_str(), static_cast<char*>(nullptr));
+        ::execve("/bin/sh", const_cast<char* const*>(argv), envp.data());
         ::_exit(127);
     }
     int status = 0;

@@ -365,3 +365,24 @@ std::string FirstChars(std::string_view text, std::size_t n)
         NextCodePoint(text, i);
     return std::string(text.substr(0, i));
 }
+
+std::u32string DecodeUtf8(std::string_view text)
+{
+    std::u32string out;
+    out.reserve(text.size());
+    for (std::size_t i = 0; i < text.size();) {
+        const char32_t c = NextCodePoint(text, i);
+        out += c >= 0x110000 ? U'\uFFFD' : c;
+    }
+    return out;
+}
+
+std::string EncodeUtf8(std::u32string_view text)
+{
+    std::string out;
+    out.reserve(text.size());
+    for (char32_t c : text)
+        AppendUtf8(out, c > 0x10FFFF || (c >= 0xD800 && c <= 0xDFFF) ? U'\uFFFD' : c);
+    return out;
+}
+

@@ -72,3 +72,10 @@ std::size_t CharCount(std::string_view text);
 
 // The first n code points of the text (all of it when shorter).
 std::string FirstChars(std::string_view text, std::size_t n);
+
+// The code points of a UTF-8 text, each invalid byte becoming U+FFFD, so that text from
+// anywhere can go to an interface that only takes valid characters.
+std::u32string DecodeUtf8(std::string_view text);
+
+// UTF-8 of code points; surrogates and values beyond U+10FFFF become U+FFFD.
+std::string EncodeUtf8(std::u32string_view text);

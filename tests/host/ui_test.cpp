@@ -1,8 +1,13 @@
-// The user-interface layer: script comments, pending words, message boxes.
+// The user-interface layer: script comments, pending words, message boxes, the locale
+// of terminal programs.
 #include "velhost/ui.h"
 
 #include <gtest/gtest.h>
+#include <langinfo.h>
 
+#include <algorithm>
+#include <clocale>
+#include <cstdlib>
 #include <sstream>
 
 #include "host_fixture.hpp"
@@ -91,6 +96,72 @@ TEST(MessageBox, TerminalAsksForAButton)
     std::istringstream none("");
     VelTerminalUI ended(none, out, false);
     EXPECT_EQ(ended.messageBox({"VELANTO", "?", MB_YESNOCANCEL}), IDCANCEL);
+}
+
+TEST(Utf8CharacterType, OnlyTheCharacterTypeChangesAndComesBack)
+{
+    if (VelUtf8CharacterType::localeName().empty())
+        GTEST_SKIP() << "no UTF-8 locale on this system";
+    std::setlocale(LC_ALL, "C");
+    {
+        VelUtf8CharacterType utf8;
+        EXPECT_STREQ(nl_langinfo(CODESET), "UTF-8");
+        EXPECT_STREQ(std::setlocale(LC_NUMERIC, nullptr), "C");
+    }
+    EXPECT_STREQ(std::setlocale(LC_CTYPE, nullptr), "C");
+}
+
+TEST(TerminalProgramEnvironment, CharacterTypeMadeUtf8OnlyWhenTheUsersIsNot)
+{
+    const std::string utf8 = VelUtf8CharacterType::localeName();
+    if (utf8.empty())
+        GTEST_SKIP() << "no UTF-8 locale on this system";
+    struct Case {
+        const char* lcAll; // null: unset
+        const char* lcCtype;
+        const char* lang;
+        std::vector<std::string> present;
+        std::vector<std::string> absent;
+    };
+    const Case cases[] = {
+        {nullptr, nullptr, "C.UTF-8", {"LANG=C.UTF-8"}, {"LC_CTYPE="}},
+        {nullptr, nullptr, nullptr, {"LC_CTYPE=" + utf8}, {"LANG="}},
+        {nullptr, nullptr, "fr_FR.ISO-8859-1", {"LANG=fr_FR.ISO-8859-1", "LC_CTYPE=" + utf8}, {}},
+        {nullptr, "POSIX", "C.UTF-8", {"LC_CTYPE=" + utf8}, {"LC_CTYPE=POSIX"}},
+        // LC_ALL would win over the character type: it becomes the language.
+        {"C", nullptr, "C.UTF-8", {"LANG=C", "LC_CTYPE=" + utf8}, {"LC_ALL=", "LANG=C.UTF-8"}},
+    };
+    auto set = [](const char* name, const char* value) {
+        if (value)
+            setenv(name, value, 1);
+        else
+            unsetenv(name);
+    };
+    const char* saved[3];
+    std::string savedText[3];
+    const char* names[3] = {"LC_ALL", "LC_CTYPE", "LANG"};
+    for (int i = 0; i < 3; ++i) {
+        saved[i] = std::getenv(names[i]);
+        savedText[i] = saved[i] ? saved[i] : "";
+    }
+    for (const Case& c : cases) {
+        SCOPED_TRACE(std::string(c.lcAll ? c.lcAll : "-") + " " + (c.lcCtype ? c.lcCtype : "-") + " " +
+                     (c.lang ? c.lang : "-"));
+        set("LC_ALL", c.lcAll);
+        set("LC_CTYPE", c.lcCtype);
+        set("LANG", c.lang);
+        const std::vector<std::string> environment = velTerminalProgramEnvironment();
+        auto has = [&](const std::string& start) {
+            return std::any_of(environment.begin(), environment.end(),
+                               [&](const std::string& e) { return e.rfind(start, 0) == 0; });
+        };
+        for (const std::string& e : c.present)
+            EXPECT_TRUE(has(e)) << e;
+        for (const std::string& e : c.absent)
+            EXPECT_FALSE(has(e)) << e;
+    }
+    for (int i = 0; i < 3; ++i)
+        set(names[i], saved[i] ? savedText[i].c_str() : nullptr);
 }
 
 } // namespace

@@ -102,6 +102,27 @@ TEST(FirstChars, CountsCodePoints)
     EXPECT_EQ(CharCount("\xff\xfe"), 2u);
 }
 
+TEST(Utf8, InvalidBytesBecomeReplacementCharacters)
+{
+    struct Case {
+        const char* text;
+        std::u32string points;
+    };
+    const Case cases[] = {
+        {"Décharger €", U"Décharger €"},
+        {"\xe9t\xe9", U"\uFFFDt\uFFFD"},       // Latin-1
+        {"a\xc3", U"a\uFFFD"},                  // cut in the middle of a character
+        {"\xed\xa0\x80", U"\uFFFD\uFFFD\uFFFD"}, // a surrogate
+        {"\xc0\xaf", U"\uFFFD\uFFFD"},           // an overlong "/"
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.text);
+        EXPECT_EQ(DecodeUtf8(c.text), c.points);
+    }
+    EXPECT_EQ(EncodeUtf8(U"Métré \U0001F600"), "Métré \xf0\x9f\x98\x80");
+    EXPECT_EQ(EncodeUtf8(std::u32string{0xD800, 0x110000}), "\xef\xbf\xbd\xef\xbf\xbd");
+}
+
 TEST(SortStrings, StableWithOrWithoutCase)
 {
     std::vector<std::string> v{"a", "B", "é", "A", "b"};

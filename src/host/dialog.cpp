@@ -148,7 +148,6 @@ bool SECTreeCtrl::Expand(HTREEITEM item, unsigned code) {
   // The selection never hides inside a closed item.
   for (HTREEITEM p = selected_ ? selected_->parent : nullptr; p != nullptr; p = p->parent)
     if (!p->expanded) selected_ = p;
-  SetScrollPos(topRow_);
   return true;
 }
 
@@ -183,10 +182,7 @@ bool SECTreeCtrl::EnsureVisible(HTREEITEM item) {
   return true;
 }
 
-void SECTreeCtrl::SetVisibleCount(int rows) {
-  visibleRows_ = std::max(0, rows);
-  SetScrollPos(topRow_);
-}
+void SECTreeCtrl::SetVisibleCount(int rows) { visibleRows_ = std::max(0, rows); }
 
 void SECTreeCtrl::SetScrollPos(int row) {
   std::vector<HTREEITEM> rows;
@@ -216,7 +212,11 @@ std::vector<HTREEITEM> SECTreeCtrl::GetVisibleItems(bool all) const {
   std::vector<HTREEITEM> rows;
   VisibleRows(rows);
   if (all) return rows;
-  const std::size_t first = std::min(rows.size(), static_cast<std::size_t>(topRow_));
+  // Closing items may have left the first row past the end: the last page shows then.
+  const std::size_t last = visibleRows_ > 0 && rows.size() > static_cast<std::size_t>(visibleRows_)
+                               ? rows.size() - static_cast<std::size_t>(visibleRows_)
+                               : 0;
+  const std::size_t first = std::min(last, static_cast<std::size_t>(topRow_));
   std::size_t end = rows.size();
   if (visibleRows_ > 0) end = std::min(end, first + static_cast<std::size_t>(visibleRows_));
   return std::vector<HTREEITEM>(rows.begin() + static_cast<std::ptrdiff_t>(first),

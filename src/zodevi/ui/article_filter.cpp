@@ -36,21 +36,6 @@ const std::vector<const CZodEVIFilterEntry*> kNoEntries;
 
 } // namespace
 
-void CZodEVIFilterEntry::Clear()
-{
-    levels.clear();
-    article = nullptr;
-    projects.clear();
-}
-
-const CZodEVIEntryProject* CZodEVIFilterEntry::Find(int kind, const std::string& name) const
-{
-    for (const CZodEVIEntryProject& project : projects)
-        if (project.kind == kind && project.name == name)
-            return &project;
-    return nullptr;
-}
-
 CZodEVIFilterEntry* CZodEVIFilterEntryArray::FindByArticle(const CZodEVIArticle* article) const
 {
     const auto found = byArticle_.find(article);

@@ -36,10 +36,6 @@ public:
     CZodEVIArticle* article = nullptr;
     // The projects in the order they were first added.
     std::vector<CZodEVIEntryProject> projects;
-
-    void Clear();
-    // The quantity of a project; null when the entry does not count it.
-    const CZodEVIEntryProject* Find(int kind, const std::string& name) const;
 };
 
 // The entries of one rebuild, owned, with what finds them fast: by article when adding,

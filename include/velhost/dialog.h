@@ -213,7 +213,9 @@ class SECTreeCtrl {
   bool storeColumnText_ = false;
   int clientWidth_ = 0;
   int imageCount_ = 0;
-  std::vector<std::unique_ptr<VelTreeItem>> items_;  // owns every item, in creation order
+  // Items live in blocks kept across DeleteAllItems: a rebuild reuses their memory.
+  static constexpr std::size_t kBlock = 256;
+  std::vector<std::unique_ptr<VelTreeItem[]>> blocks_;
   std::vector<VelTreeItem*> roots_;
   std::size_t count_ = 0;
   HTREEITEM selected_ = nullptr;

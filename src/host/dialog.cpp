@@ -45,20 +45,25 @@ int SECTreeCtrl::InsertColumn(int column, const std::string& heading, int format
 }
 
 HTREEITEM SECTreeCtrl::InsertItem(const std::string& text, HTREEITEM parent) {
-  auto item = std::make_unique<VelTreeItem>();
+  if (count_ == blocks_.size() * kBlock) blocks_.push_back(std::make_unique<VelTreeItem[]>(kBlock));
+  VelTreeItem* item = &blocks_[count_ / kBlock][count_ % kBlock];
+  ++count_;
+  // A reused item keeps the room of its texts and lists.
   item->text = text;
+  item->columns.clear();
+  item->image = item->selectedImage = 0;
+  item->data = 0;
   item->parent = parent;
+  item->children.clear();
+  item->expanded = false;
   std::vector<VelTreeItem*>& siblings = parent ? parent->children : roots_;
   item->position = siblings.size();
-  siblings.push_back(item.get());
-  items_.push_back(std::move(item));
-  ++count_;
-  return items_.back().get();
+  siblings.push_back(item);
+  return item;
 }
 
 bool SECTreeCtrl::DeleteAllItems() {
   roots_.clear();
-  items_.clear();
   count_ = 0;
   selected_ = nullptr;
   topRow_ = 0;

@@ -24,6 +24,7 @@ struct CZodEVIEntryProject {
     std::string name;
     int kind = 0;
     double quantity = 0;
+    std::size_t id = 0;  // the project's number in its entry array
 };
 
 // One article present in the filter. A project is known by its kind and its name
@@ -38,44 +39,47 @@ public:
     std::vector<CZodEVIEntryProject> projects;
 };
 
-// The entries of one rebuild, owned, with what finds them fast: by article when adding,
-// by level path when filling the tree.
+// The entries of one rebuild, owned, with what finds them fast: by article and project
+// when adding, by level path when filling the tree.
 class CZodEVIFilterEntryArray {
 public:
+    // One place of the article tree: its sublevels in the order of first appearance (each
+    // once, ignoring case) with the node under each, and the entries whose levels are
+    // exactly its path, in order.
+    struct LevelNode {
+        std::vector<std::string> subLevels;
+        std::vector<std::size_t> children;
+        std::vector<CZodEVIFilterEntry*> entries;
+    };
+
     std::size_t GetSize() const { return entries_.size(); }
     const CZodEVIFilterEntry& operator[](std::size_t i) const { return *entries_[i]; }
     CZodEVIFilterEntry* FindByArticle(const CZodEVIArticle* article) const;
 
-    // The sublevels met under a level path, in the order of first appearance (each once,
-    // ignoring case), and the entries whose levels are exactly that path, in order.
+    // The node of a level path (levels compared ignoring case), the root for an empty
+    // one; null when nothing lies there.
+    const LevelNode* NodeOf(const std::vector<std::string>& path) const;
+    const LevelNode& Node(std::size_t index) const;
     const std::vector<std::string>& SubLevels(const std::vector<std::string>& path) const;
-    const std::vector<const CZodEVIFilterEntry*>& EntriesAt(const std::vector<std::string>& path) const;
+    const std::vector<CZodEVIFilterEntry*>& EntriesAt(const std::vector<std::string>& path) const;
+
+    // A project's number in this array, for adding many quantities of one project.
+    std::size_t ProjectId(int kind, const std::string& name);
+    // AddArticleQuantity for a project already numbered.
+    void Add(CZodEVIArticle* article, std::size_t projectId, const std::string& name, double quantity, int kind);
 
 private:
-    friend void AddArticleQuantity(CZodEVIFilterEntryArray&, CZodEVIArticle*, const std::string&, double, int);
     friend void SortEntries(CZodEVIFilterEntryArray&, const std::unordered_map<const CZodEVIArticle*, std::size_t>&);
-    struct LevelNode {
-        std::vector<std::string> subLevels;
-        std::vector<std::string> foldedSubLevels;
-        std::vector<const CZodEVIFilterEntry*> entries;
-    };
-    struct SlotHash {
-        std::size_t operator()(const std::pair<const CZodEVIFilterEntry*, std::size_t>& key) const
-        {
-            return std::hash<const void*>()(key.first) * 31 + key.second;
-        }
-    };
-    const LevelNode* NodeOf(const std::vector<std::string>& path) const;
     void IndexLevels() const;
 
     std::vector<std::unique_ptr<CZodEVIFilterEntry>> entries_;
     std::unordered_map<const CZodEVIArticle*, CZodEVIFilterEntry*> byArticle_;
-    // Projects by "<kind>\t<name>", and each entry's slot of a project.
+    // Projects by "<kind>\t<name>".
     std::unordered_map<std::string, std::size_t> projectIds_;
-    std::unordered_map<std::pair<const CZodEVIFilterEntry*, std::size_t>, std::size_t, SlotHash> slots_;
-    // Level paths (folded levels, each ended by a NUL) to what lies there; built on the
-    // first query after a change.
-    mutable std::unordered_map<std::string, LevelNode> levels_;
+    // The level tree (node 0 is the root) and each node's child by parent and folded
+    // level; built on the first query after a change.
+    mutable std::vector<LevelNode> nodes_;
+    mutable std::unordered_map<std::string, std::size_t> childOf_;
     mutable bool indexed_ = false;
 };
 
@@ -88,6 +92,9 @@ public:
 
 private:
     std::unordered_map<std::string, CZodEVIArticleList> byKey_;
+    // A key as some article spells it, to its articles: most keys are found without
+    // folding them.
+    std::unordered_map<std::string, const CZodEVIArticleList*> bySpelling_;
 };
 
 // The category levels of a tree path: the levels before the code and designation,
@@ -108,6 +115,9 @@ int ListSubLevels(const CZodEVIFilterEntryArray& entries, const std::vector<std:
                   std::vector<std::string>& out, bool sort);
 int ListArticlesAt(const CZodEVIFilterEntryArray& entries, const std::vector<std::string>& path,
                    std::vector<std::string>& out, bool sort);
+
+// The total of an entry's quantities, added in the order of its projects.
+double EntryTotal(const CZodEVIFilterEntry& entry);
 
 // The estimate lines of one entry: one line with the sum of its quantities, or one line
 // per project. Each line also carries its projects with their kinds (assocText1).

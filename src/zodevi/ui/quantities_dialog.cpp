@@ -64,6 +64,17 @@ VelDialogTemplate MetExpArtTemplate()
     return t;
 }
 
+const std::vector<std::unique_ptr<CZodEVIAssocLine>>& CZodEVILeafLines::Lines()
+{
+    if (!built_) {
+        double total = 0;
+        const CZodEVIArticle* article = nullptr;
+        BuildLines(entry, lines_, total, article, perProject);
+        built_ = true;
+    }
+    return lines_;
+}
+
 void CZodEVIGroupSelection::Clear()
 {
     itemNames.clear();
@@ -279,6 +290,7 @@ void DlgMetExpArt::RefillArticleTree()
     CZodEVIFilterEntryArray entries;
     CollectEntries(inputs, entries);
     SortEntries(entries, m_positions);
+    m_itemLines.reserve(entries.GetSize());
     FillArticleLevel(entries, {}, TVI_ROOT);
 
     for (HTREEITEM root = m_treeArticles.GetRootItem(); root != nullptr; root = m_treeArticles.GetNextSiblingItem(root))
@@ -289,37 +301,37 @@ void DlgMetExpArt::RefillArticleTree()
         m_treeArticles.EnsureVisible(selected);
 }
 
-void DlgMetExpArt::FillArticleLevel(const CZodEVIFilterEntryArray& entries, const std::vector<std::string>& path,
+void DlgMetExpArt::FillArticleLevel(CZodEVIFilterEntryArray& entries, const std::vector<std::string>& path,
                                     HTREEITEM parent)
 {
-    std::vector<std::string> levels;
-    ListSubLevels(entries, path, levels, false);
-    std::vector<std::string> sub = path;
-    for (const std::string& level : levels) {
-        HTREEITEM item = InsertItem(m_treeArticles, level, parent, kUnchecked);
-        sub.push_back(level);
-        FillArticleLevel(entries, sub, item);
-        sub.pop_back();
-    }
-    if (!levels.empty())
-        m_treeArticles.Expand(parent, TVE_EXPAND);
+    if (const CZodEVIFilterEntryArray::LevelNode* node = entries.NodeOf(path))
+        FillArticleNode(entries, *node, parent);
+}
 
-    std::vector<std::string> designations;
-    if (ListArticlesAt(entries, path, designations, false) == 0)
+void DlgMetExpArt::FillArticleNode(CZodEVIFilterEntryArray& entries, const CZodEVIFilterEntryArray::LevelNode& node,
+                                   HTREEITEM parent)
+{
+    for (std::size_t i = 0; i < node.subLevels.size(); ++i) {
+        HTREEITEM item = InsertItem(m_treeArticles, node.subLevels[i], parent, kUnchecked);
+        FillArticleNode(entries, entries.Node(node.children[i]), item);
+    }
+    if (!node.subLevels.empty())
+        m_treeArticles.Expand(parent, TVE_EXPAND);
+    if (node.entries.empty())
         return;
     // Each leaf is its own entry's, even when two articles of one level share a
     // designation (their nature levels are not shown).
-    const std::vector<const CZodEVIFilterEntry*>& here = entries.EntriesAt(path);
-    for (std::size_t i = 0; i < here.size() && i < designations.size(); ++i) {
-        HTREEITEM leaf = InsertItem(m_treeArticles, designations[i], parent, kUnchecked);
-        std::vector<std::unique_ptr<CZodEVIAssocLine>> lines;
-        double total = 0;
-        const CZodEVIArticle* article = nullptr;
-        if (!BuildLines(*here[i], lines, total, article, m_nQuantityMode == 1))
+    for (CZodEVIFilterEntry* entry : node.entries) {
+        HTREEITEM leaf = InsertItem(m_treeArticles, entry->article->designation, parent, kUnchecked);
+        if (entry->projects.empty())
             continue;
-        m_itemLines[leaf] = std::move(lines);
-        m_treeArticles.SetItemText(leaf, 1, PriceColumnText(*article, m_strCurrency));
-        m_treeArticles.SetItemText(leaf, 2, QuantityColumnText(total, article->unit));
+        const CZodEVIArticle& article = *entry->article;
+        m_treeArticles.SetItemText(leaf, 1, PriceColumnText(article, m_strCurrency));
+        m_treeArticles.SetItemText(leaf, 2, QuantityColumnText(EntryTotal(*entry), article.unit));
+        CZodEVILeafLines& lines = m_itemLines[leaf];
+        lines.entry.article = entry->article;
+        lines.entry.projects = std::move(entry->projects);
+        lines.perProject = m_nQuantityMode == 1;
     }
     m_treeArticles.Expand(parent, TVE_EXPAND);
 }
@@ -346,14 +358,26 @@ void DlgMetExpArt::SaveCheckedPaths(HTREEITEM item, std::unordered_map<std::stri
 
 void DlgMetExpArt::RestoreCheckedPaths(HTREEITEM item, const std::unordered_map<std::string, std::string>& paths)
 {
-    if (m_treeArticles.ItemHasChildren(item)) {
-        for (HTREEITEM child = m_treeArticles.GetChildItem(item); child != nullptr;
-             child = m_treeArticles.GetNextSiblingItem(child))
-            RestoreCheckedPaths(child, paths);
+    if (paths.empty())
+        return;
+    const HTREEITEM parent = m_treeArticles.GetParentItem(item);
+    RestoreCheckedPaths(item, parent ? ItemPath(m_treeArticles, parent) : std::string(), paths);
+}
+
+void DlgMetExpArt::RestoreCheckedPaths(HTREEITEM item, const std::string& parentPath,
+                                       const std::unordered_map<std::string, std::string>& paths)
+{
+    const std::string path = parentPath.empty() && m_treeArticles.GetParentItem(item) == nullptr
+                                 ? m_treeArticles.GetItemText(item)
+                                 : parentPath + "\\" + m_treeArticles.GetItemText(item);
+    if (!m_treeArticles.ItemHasChildren(item)) {
+        if (paths.find(path) != paths.end())
+            SetItemState(m_treeArticles, item, kChecked);
         return;
     }
-    if (paths.find(ItemPath(m_treeArticles, item)) != paths.end())
-        SetItemState(m_treeArticles, item, kChecked);
+    for (HTREEITEM child = m_treeArticles.GetChildItem(item); child != nullptr;
+         child = m_treeArticles.GetNextSiblingItem(child))
+        RestoreCheckedPaths(child, path, paths);
 }
 
 void DlgMetExpArt::UpdateCategoryStates(HTREEITEM item)
@@ -478,7 +502,7 @@ void DlgMetExpArt::CollectCheckedLines(HTREEITEM item)
     if (ItemState(m_treeArticles, item) == kChecked) {
         const auto found = m_itemLines.find(item);
         if (found != m_itemLines.end())
-            for (const auto& line : found->second)
+            for (const auto& line : found->second.Lines())
                 if (line != nullptr && m_selectedSet.insert(line.get()).second)
                     m_selectedLines.push_back(line.get());
     }

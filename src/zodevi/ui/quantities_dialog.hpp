@@ -37,6 +37,19 @@ struct CZodEVIGroupSelection {
     void Clear();
 };
 
+// The lines of one article leaf. The rebuild keeps the article and its projects; the
+// lines are made the first time they are asked for, since most leaves are never checked
+// and every click rebuilds the tree.
+struct CZodEVILeafLines {
+    CZodEVIFilterEntry entry;
+    bool perProject = false;
+    const std::vector<std::unique_ptr<CZodEVIAssocLine>>& Lines();
+
+private:
+    std::vector<std::unique_ptr<CZodEVIAssocLine>> lines_;
+    bool built_ = false;
+};
+
 class DlgMetExpArt : public CVelDialog {
 public:
     // The dialog over a schedule (the current one by default).
@@ -56,8 +69,8 @@ public:
     void DiscoverProjects();
     void FillProjectTree(int state);
     void RefillArticleTree();
-    void FillArticleLevel(const CZodEVIFilterEntryArray& entries, const std::vector<std::string>& path,
-                          HTREEITEM parent);
+    // Fills the tree under parent with what lies at path; takes the entries' projects.
+    void FillArticleLevel(CZodEVIFilterEntryArray& entries, const std::vector<std::string>& path, HTREEITEM parent);
     void SaveCheckedPaths(HTREEITEM item, std::unordered_map<std::string, std::string>& paths) const;
     void RestoreCheckedPaths(HTREEITEM item, const std::unordered_map<std::string, std::string>& paths);
     void OnClickProjects(long* result);
@@ -91,12 +104,17 @@ public:
     CZodEVIGroupSelection m_korvaneSelection;
     CZodEVIGroupSelection m_platformSelection;
 
-    std::unordered_map<HTREEITEM, std::vector<std::unique_ptr<CZodEVIAssocLine>>> m_itemLines;
+    std::unordered_map<HTREEITEM, CZodEVILeafLines> m_itemLines;
     std::vector<CZodEVIAssocLine*> m_selectedLines;
 
 private:
     void OnClick(SECTreeCtrl& tree, long* result);
     HTREEITEM InsertItem(SECTreeCtrl& tree, const std::string& text, HTREEITEM parent, int state);
+    void FillArticleNode(CZodEVIFilterEntryArray& entries, const CZodEVIFilterEntryArray::LevelNode& node,
+                         HTREEITEM parent);
+    // Builds each item's path from its parent's, so a restore never climbs the tree.
+    void RestoreCheckedPaths(HTREEITEM item, const std::string& parentPath,
+                             const std::unordered_map<std::string, std::string>& paths);
     std::string ItemPath(const SECTreeCtrl& tree, HTREEITEM item) const;
     // Every category's state from its articles, children first.
     void UpdateCategoryStates(HTREEITEM item);

@@ -199,7 +199,8 @@ class SECTreeCtrl {
   std::vector<HTREEITEM> GetVisibleItems(bool all = false) const;
   // The item at a client point, with TVHT_* flags; null (TVHT_NOWHERE) below the rows.
   HTREEITEM HitTest(CPoint point, unsigned* flags) const;
-  // Where a part of a shown item lies, in client coordinates; false when not shown.
+  // Where a part of a shown item lies, in client coordinates (the row: from the left
+  // edge to the end of the text); false when not shown.
   bool GetItemRect(HTREEITEM item, CRect& rect, VelTreePart part) const;
 
  private:

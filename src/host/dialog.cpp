@@ -258,7 +258,9 @@ bool SECTreeCtrl::GetItemRect(HTREEITEM item, CRect& rect, VelTreePart part) con
   const int y = static_cast<int>(found - rows.begin()) * rowHeight;
   const int imageX = GetItemLevel(item) * metrics_.indent;
   switch (part) {
-    case VelTreePart::kRow: rect = {0, y, clientWidth_, rowHeight}; break;
+    case VelTreePart::kRow:
+      rect = {0, y, imageX + metrics_.imageWidth + 1 + static_cast<int>(CharCount(item->text)), rowHeight};
+      break;
     case VelTreePart::kImage: rect = {imageX, y, metrics_.imageWidth, rowHeight}; break;
     case VelTreePart::kLabel:
       rect = {imageX + metrics_.imageWidth, y, 1 + static_cast<int>(CharCount(item->text)), rowHeight};

@@ -56,9 +56,11 @@ demo: build
 	  --script ../../examples/demo.scr projet_vrd.dxf
 	@echo
 	@echo "Résultats de la démonstration, dans $(BUILD)/demo :"
-	@echo "  projet_vrd.dxf         le dessin, avec les quantités des réseaux EP et EU"
+	@echo "  projet_vrd.dxf         le dessin, avec les quantités des réseaux EP et EU et ses devis"
 	@echo "  VelaBordereau.xml      le bordereau des prix mis à jour (PVC 315 du réseau EP à 72,50 € HT)"
 	@echo "  VelaBordereau.xml.bak  le bordereau tel qu'il était avant le dernier enregistrement"
+	@echo "  Devis.xlsx, Devis.csv      le devis de tout le projet, une ligne par projet"
+	@echo "  Devis 2.xlsx, Devis 2.csv  le devis du seul réseau EU, quantités sommées"
 
 bench: deps
 	cmake -S . -B build/bench -DCMAKE_BUILD_TYPE=Release -DVEL_BENCH=ON

@@ -82,4 +82,8 @@ enum class VelCommandResult { kDone, kUnknown, kFailed };
 // French message when the answer is not kDone.
 VelCommandResult velRunCommand(const std::string& name, std::string& error);
 
+// Makes the running command end as failed with this French message once it returns (a
+// script then stops at the command's line); outside a command, nothing happens.
+void velFailCommand(const std::string& message);
+
 #pragma GCC visibility pop

@@ -48,6 +48,8 @@ const char* velMessageBoxLabel(int answer);
 // The box as the output shows it: caption with its kind, then the text.
 std::string velMessageBoxTranscript(const VelMessageBox& box);
 
+class CVelDialog;
+
 // A line read from the user, with where it came from (for messages).
 struct VelInputLine {
   std::string text;
@@ -66,6 +68,9 @@ class VelUserInterface {
   virtual int messageBox(const VelMessageBox& box) = 0;
   // True when nobody is there to answer (answers come from a script).
   virtual bool isScripted() const = 0;
+  // Runs a modal dialog to its end and answers IDOK or IDCANCEL; by default through
+  // the line view of velhost/dialog.h.
+  virtual int runDialog(CVelDialog& dialog);
   // True once the input has ended (a readLine answering nullopt then means "no more
   // input" rather than a cancelled prompt).
   bool inputEnded() const { return ended_; }

@@ -68,7 +68,7 @@ resbuf* RecordData(const std::string& projectName, const std::vector<Quantity>& 
 {
     VelRbBuilder builder;
     builder.add(velRbString(kXdRegAppName, kRecordApp));
-    builder.add(velRbString(kXdAsciiString, "PRJ_NOM"));
+    builder.add(velRbString(kXdAsciiString, velproj::kNameMarker));
     builder.add(velRbString(kXdAsciiString, projectName));
     for (const Quantity& q : quantities) {
         builder.add(velRbString(kXdAsciiString, q.key));

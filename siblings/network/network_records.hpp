@@ -8,12 +8,16 @@
 #include <vector>
 
 #include "network_model.hpp"
+#include "velsiblings/project_records.h"
 
 namespace network {
 
-inline constexpr const char* kRecordApp = "DAZUVUVUD";
-inline constexpr const char* kNetworksDictionary = "VELANTO_RSX_VRD";
-inline constexpr const char* kProjectsDictionary = "PROJECTS";
+// Where and how the records are filed: the one definition every reader shares.
+inline constexpr const velproj::ProjectGroupPlace& kNetworkPlace = velproj::kProjectGroups[0];
+static_assert(kNetworkPlace.kind == velproj::kKindNetwork, "the networks' place comes first");
+inline constexpr const char* kRecordApp = velproj::kRecordApp;
+inline constexpr const char* kNetworksDictionary = kNetworkPlace.first;
+inline constexpr const char* kProjectsDictionary = kNetworkPlace.second;
 
 // Limits of the trench depth classes, in metres: 0-1.30, 1.30-2.00, 2.00-3.50, over 3.50.
 inline const std::vector<double> kDepthBounds = {0.0, 1.30, 2.00, 3.50};

@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <exception>
+#include <optional>
 
 #include "host_internal.h"
 #include "text/text.hpp"
@@ -30,6 +31,17 @@ const char* AcEdCommandIterator::commandGroup() const {
 const char* AcEdCommandStack::className() const { return "AcEdCommandStack"; }
 
 namespace {
+
+// The failure a command's dialog reported, while commands run (they may nest).
+struct CommandFailure {
+  int depth = 0;
+  std::optional<std::string> message;
+};
+
+CommandFailure& Failure() {
+  static CommandFailure failure;
+  return failure;
+}
 
 bool ValidName(const char* name) {
   if (name == nullptr || *name == '\0') return false;
@@ -134,12 +146,25 @@ VelCommandResult velRunCommand(const std::string& name, std::string& error) {
   VelAppScope scope(cmd.owner);
   acDocManagerPtr()->lockForCommand(cmd.globalName.c_str());
   VelCommandResult result = VelCommandResult::kDone;
+  std::optional<std::string> outer = std::move(Failure().message);
+  Failure().message.reset();
+  ++Failure().depth;
   try {
     cmd.function();
   } catch (const std::exception& e) {
     error = FormatString("La commande %s a échoué : %s", cmd.globalName.c_str(), e.what());
     result = VelCommandResult::kFailed;
   }
+  --Failure().depth;
+  if (Failure().message && result == VelCommandResult::kDone) {
+    error = *Failure().message;
+    result = VelCommandResult::kFailed;
+  }
+  Failure().message = std::move(outer);
   acDocManagerPtr()->unlockAfterCommand(cmd.globalName.c_str());
   return result;
+}
+
+void velFailCommand(const std::string& message) {
+  if (Failure().depth > 0 && !Failure().message) Failure().message = message;
 }

@@ -1,5 +1,7 @@
 #!/usr/bin/env python3
-"""Runs the shipped demo on copies of the example files and checks what it leaves.
+"""Runs the shipped demo on copies of the example files and checks what it leaves: the
+schedule with its new price, and the two estimates whose totals must follow from the
+drawing's records and the schedule's prices.
 
 usage: run_demo.py VELHOST MODULES_DIR EXAMPLES_DIR WORK_DIR
 """
@@ -8,6 +10,8 @@ import shutil
 import subprocess
 import sys
 import xml.etree.ElementTree as ET
+
+from estimate_totals import expected_total, workbook_total
 
 
 def main():
@@ -36,6 +40,21 @@ def main():
         failures.append(f"PVC 315 of EP priced {prices} in the written schedule")
     if not os.path.exists(os.path.join(work, "VelaBordereau.xml.bak")):
         failures.append("the previous schedule was not kept as .bak")
+    for text in ("Devis « Devis » :", "Devis « Devis 2 » :", "[x] EU\n    [x] EU Les Tilleuls"):
+        if text not in output:
+            failures.append(f"missing from the output: {text!r}")
+    drawing, prices = os.path.join(work, "projet_vrd.dxf"), os.path.join(work, "VelaBordereau.xml")
+    # Everything, one line per project; then the EU network alone, summed.
+    for name, kept, per_project in (("Devis", lambda kind, project: True, True),
+                                    ("Devis 2", lambda kind, project: project == "EU Les Tilleuls", False)):
+        for extension in (".xlsx", ".csv"):
+            if not os.path.exists(os.path.join(work, name + extension)):
+                failures.append(f"{name}{extension} was not written")
+        if os.path.exists(os.path.join(work, name + ".xlsx")):
+            expected = expected_total(drawing, prices, kept, per_project)
+            shown = workbook_total(os.path.join(work, name + ".xlsx"))
+            if shown is None or abs(shown - expected) > 0.005:
+                failures.append(f"{name}.xlsx: Total HT {shown}, expected {expected} from the drawing and the prices")
     if failures:
         print(output)
         print("\n".join(failures))

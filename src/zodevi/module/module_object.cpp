@@ -280,11 +280,4 @@ void ListCommandsCommand()
     MainServices()->ShowCommandList(kZodEVITitle, kZodEVIModuleName, 0, 13, lines);
 }
 
-void CreateEstimateCommand()
-{
-    MainServices()->ShowInfo("permet de créer un métré (devis, quantitatifs...etc) à partir des données des modules VRD");
-    CommandSettingsScope settings(false);
-    acutPrintf("%s", "\nLa création de devis à partir du dessin n'est pas encore disponible dans cette version.\n");
-}
-
 void TestCommand() {}

@@ -111,4 +111,8 @@ std::string ModuleNameWithoutVersion(std::string name);
 // Bodies of the module's commands.
 void ListCommandsCommand();
 void CreateEstimateCommand();
+
+// The name of a new estimate: "Devis", else "Devis 2", "Devis 3"... compared without
+// regard to case with the existing names, each rename starting again from the first.
+std::string ChooseEstimateName(const std::vector<std::string>& existing);
 void TestCommand();

@@ -97,4 +97,10 @@ std::int32_t VtMetre_SymbMonetaire(std::string* symbol)
     return CallMetre<VtMetre_SymbMonetaireFn>("VtMetre_SymbMonetaire", symbol);
 }
 
+std::int32_t VtMetre_AfficherAssoc(const std::string& name, std::vector<CZodEVIAssocLine*>* lines, std::int32_t show,
+                                   std::int32_t mode)
+{
+    return CallMetre<VtMetre_AfficherAssocFn>("VtMetre_AfficherAssoc", name, lines, show, mode);
+}
+
 } // namespace sibling

@@ -10,6 +10,7 @@
 
 #include "velhost/rx.h"
 #include "velsiblings/main_services.h"
+#include "zodevi/assoc_line.h"
 
 // Module files and service names of the siblings.
 inline constexpr const char* kMetreModule = "VelMetre15.arx";
@@ -38,6 +39,8 @@ using Rsx_WriteXDataMetresFn = std::int32_t();
 using Rsx_GetRsxFromTypeFn = std::int32_t(std::string* networkName, std::vector<std::string>* projects);
 using VtMetre_ListeDesMetresFn = std::int32_t(std::vector<std::string>* names, std::int32_t* out);
 using VtMetre_SymbMonetaireFn = std::int32_t(std::string* symbol);
+using VtMetre_AfficherAssocFn = std::int32_t(std::string name, std::vector<CZodEVIAssocLine*>* lines, std::int32_t show,
+                                             std::int32_t mode);
 
 // Calls the function a sibling exports under symbol, as a function of type Fn; answers
 // 1 without calling when the function cannot be found, else the function's answer.
@@ -70,4 +73,6 @@ std::int32_t Rsx_WriteXDataMetres();
 std::int32_t Rsx_GetRsxFromType(std::string* networkName, std::vector<std::string>* projects);
 std::int32_t VtMetre_ListeDesMetres(std::vector<std::string>* names, std::int32_t* out);
 std::int32_t VtMetre_SymbMonetaire(std::string* symbol);
+std::int32_t VtMetre_AfficherAssoc(const std::string& name, std::vector<CZodEVIAssocLine*>* lines, std::int32_t show,
+                                   std::int32_t mode);
 } // namespace sibling

@@ -3,7 +3,9 @@
 // shared by every module that reads them (the network module writes them).
 #pragma once
 
+#include <algorithm>
 #include <cmath>
+#include <memory>
 #include <cstddef>
 #include <string>
 #include <string_view>
@@ -12,6 +14,7 @@
 #include <vector>
 
 #include "text/text.hpp"
+#include "velhost/dbase.h"
 #include "velhost/resbuf.h"
 
 namespace velproj {
@@ -135,6 +138,55 @@ inline bool ReadProjectRecord(const resbuf* list, std::string& name, QuantityTab
     item = value;
   }
   return true;
+}
+
+// Walks the project records of a drawing, read only: the four groups in order, each
+// group's entries in ascending byte order of their keys (the host's own sorted walk ignores
+// case, which would make the record that wins a repeated name depend on the letters' case),
+// and calls fn(kind, name, quantities) for each record that reads. Every failure is silent
+// and only gives fewer records.
+template <class Fn>
+void ForEachProjectRecord(AcDbDatabase* database, Fn&& fn) {
+  struct Opened {
+    AcDbObject* object = nullptr;
+    ~Opened() {
+      if (object != nullptr) object->close();
+    }
+  };
+  const auto open = [](AcDbDictionary* parent, const char* key, Opened& holder) -> AcDbDictionary* {
+    AcDbObject* object = nullptr;
+    if (parent->getAt(key, object, AcDb::kForRead) != Acad::eOk || object == nullptr) return nullptr;
+    holder.object = object;
+    return dynamic_cast<AcDbDictionary*>(object);
+  };
+  AcDbDictionary* named = nullptr;
+  if (database == nullptr || database->getNamedObjectsDictionary(named, AcDb::kForRead) != Acad::eOk ||
+      named == nullptr)
+    return;
+  Opened namedHolder{named};
+  for (const ProjectGroupPlace& place : kProjectGroups) {
+    Opened firstHolder;
+    AcDbDictionary* first = open(named, place.first, firstHolder);
+    if (first == nullptr) continue;
+    Opened secondHolder;
+    AcDbDictionary* second = open(first, place.second, secondHolder);
+    if (second == nullptr) continue;
+    std::vector<std::pair<std::string, AcDbObjectId>> entries;
+    {
+      std::unique_ptr<AcDbDictionaryIterator> it(second->newIterator(AcRx::kDictCollated));
+      for (; !it->done(); it->next()) entries.emplace_back(it->name(), it->objectId());
+    }
+    std::stable_sort(entries.begin(), entries.end(), [](const auto& a, const auto& b) { return a.first < b.first; });
+    for (const auto& entry : entries) {
+      AcDbObject* object = nullptr;
+      if (acdbOpenObject(object, entry.second, AcDb::kForRead) != Acad::eOk || object == nullptr) continue;
+      const VelRbPtr record(object->xData(kRecordApp));
+      object->close();
+      std::string name;
+      QuantityTable quantities;
+      if (record && ReadProjectRecord(record.get(), name, quantities)) fn(place.kind, name, std::move(quantities));
+    }
+  }
 }
 
 }  // namespace velproj

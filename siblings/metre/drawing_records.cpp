@@ -37,36 +37,9 @@ resbuf* EstimateData(const EstimateRecord& record)
 ProjectTables ProjectTables::Read(AcDbDatabase& database)
 {
     ProjectTables tables;
-    AcDbDictionary* named = nullptr;
-    if (database.getNamedObjectsDictionary(named, AcDb::kForRead) != Acad::eOk)
-        return tables;
-    Closer namedCloser{named};
-    for (const velproj::ProjectGroupPlace& group : velproj::kProjectGroups) {
-        AcDbObject* firstObject = nullptr;
-        if (named->getAt(group.first, firstObject, AcDb::kForRead) != Acad::eOk)
-            continue;
-        Closer firstCloser{firstObject};
-        auto* first = dynamic_cast<AcDbDictionary*>(firstObject);
-        AcDbObject* secondObject = nullptr;
-        if (first == nullptr || first->getAt(group.second, secondObject, AcDb::kForRead) != Acad::eOk)
-            continue;
-        Closer secondCloser{secondObject};
-        auto* second = dynamic_cast<AcDbDictionary*>(secondObject);
-        if (second == nullptr)
-            continue;
-        std::unique_ptr<AcDbDictionaryIterator> it(second->newIterator(AcRx::kDictSorted));
-        for (; !it->done(); it->next()) {
-            AcDbObject* entry = nullptr;
-            if (it->getObject(entry, AcDb::kForRead) != Acad::eOk)
-                continue;
-            Closer entryCloser{entry};
-            VelRbPtr data(entry->xData(velproj::kRecordApp));
-            std::string name;
-            velproj::QuantityTable quantities;
-            if (data && velproj::ReadProjectRecord(data.get(), name, quantities))
-                tables.Add(group.kind, name, std::move(quantities));
-        }
-    }
+    velproj::ForEachProjectRecord(&database, [&](int kind, const std::string& name, velproj::QuantityTable quantities) {
+        tables.Add(kind, name, std::move(quantities));
+    });
     return tables;
 }
 

@@ -60,19 +60,8 @@ struct ReturnedArticles {
 // so that every article stays in the group of its own key.
 void ApplyModification(CZodEVIBdr& bdr, const CZodEVIArticle& returned)
 {
-    CZodEVIArticle* stored = bdr.FindByTreePath(returned.treePath).article;
-    if (stored == nullptr)
-        return;
-    const std::string oldKey = stored->groupKey;
-    *stored = returned;
-    if (oldKey == stored->groupKey)
-        return;
-    if (CZodEVIGroup* old = bdr.GroupOf(oldKey, false)) {
-        const auto it = std::find(old->begin(), old->end(), stored);
-        if (it != old->end())
-            old->erase(it);
-    }
-    bdr.GroupOf(stored->groupKey, true)->push_back(stored);
+    if (CZodEVIArticle* stored = bdr.FindByTreePath(returned.treePath).article)
+        bdr.ReplaceArticle(*stored, returned);
 }
 
 // Applies the editor's changes; true when an added article took a neighbour's group key.

@@ -1,7 +1,9 @@
 // Reading and writing schedules of 1,000 to 100,000 articles through the exchange (the
 // store's Read and Write, the metre module's XML file behind them), side by side with a
-// bare pugixml parse and save of the same file.
+// bare pugixml parse and save of the same file, and their ratios.
 #include "schedule/schedule_exchange.hpp"
+
+#include "ratio_reporter.hpp"
 
 #include "metre_services.hpp"
 #include "module/siblings.hpp"
@@ -131,4 +133,14 @@ BENCHMARK(BM_BareSave)->Arg(1000)->Arg(10000)->Arg(100000)->Unit(benchmark::kMil
 
 } // namespace
 
-BENCHMARK_MAIN();
+int main(int argc, char** argv)
+{
+    std::vector<RatioReporter::Ratio> ratios;
+    for (const char* n : {"1000", "10000", "100000"}) {
+        ratios.push_back({std::string("Read / parse, ") + n + " articles", std::string("BM_Read/") + n,
+                          std::string("BM_BareParse/") + n});
+        ratios.push_back({std::string("Write / save, ") + n + " articles", std::string("BM_Write/") + n,
+                          std::string("BM_BareSave/") + n});
+    }
+    return RunWithRatios(argc, argv, std::move(ratios));
+}

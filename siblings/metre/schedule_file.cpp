@@ -118,7 +118,9 @@ bool SetFieldValue(CZodEVIArticle& article, const CZodEVIArticleField& field, co
     std::uint64_t n = 0;
     switch (field.type) {
     case CZodEVIArticleField::Type::Text:
-        article.*field.text = value;
+        // Most texts of a file are empty, and a field is read once, still empty.
+        if (*value != '\0')
+            article.*field.text = value;
         return true;
     case CZodEVIArticleField::Type::Real:
         // Up to 15 digits a whole number is exact as a double; "-0" stays negative.
@@ -489,7 +491,8 @@ FileResult ReadWholeFile(const std::string& path, std::unique_ptr<char[]>& data,
         return FileResult::Failure(FormatString("Bordereau « %s » : ouverture impossible (%s).", path.c_str(),
                                                 ErrnoText(errno).c_str()));
     struct stat status {};
-    bool whole = ::fstat(fd, &status) == 0;
+    // Only a regular file has a size to read.
+    bool whole = ::fstat(fd, &status) == 0 && S_ISREG(status.st_mode);
     size = whole ? static_cast<std::size_t>(status.st_size) : 0;
     data = std::make_unique_for_overwrite<char[]>(size + 1);
     std::size_t done = 0;

@@ -6,6 +6,8 @@
 
 #include <algorithm>
 #include <charconv>
+#include <cstdint>
+#include <cstring>
 #include <unordered_map>
 #include <unordered_set>
 
@@ -38,12 +40,102 @@ bool SplitCode(std::string_view foldedCode, std::string_view& prefix, int& numbe
     return true;
 }
 
-using KeyIndex = std::unordered_map<std::string, std::size_t>;
+// Folded quantity key -> position of the first article holding it. The keys lie end to
+// end in one string and the slots in one array: in a network of thousands of articles a
+// lookup then costs two cache misses, not a walk through scattered nodes.
+class KeyIndex {
+public:
+    static constexpr std::size_t npos = static_cast<std::size_t>(-1);
+
+    void Reserve(std::size_t count)
+    {
+        while (slots_.size() < 2 * count)
+            Grow();
+    }
+
+    // Records the key at `position` unless an earlier article holds it.
+    void Add(std::string_view key, std::size_t position)
+    {
+        if (2 * (count_ + 1) > slots_.size())
+            Grow();
+        const std::uint32_t hash = Hash(key);
+        Slot& slot = slots_[SlotOf(key, hash)];
+        if (slot.position != 0)
+            return;
+        slot = {position + 1, keys_.size(), hash, static_cast<std::uint32_t>(key.size())};
+        keys_.append(key);
+        ++count_;
+    }
+
+    std::size_t Find(std::string_view key) const
+    {
+        if (slots_.empty())
+            return npos;
+        const Slot& slot = slots_[SlotOf(key, Hash(key))];
+        return slot.position == 0 ? npos : slot.position - 1;
+    }
+
+    // Same keys at the same positions.
+    bool operator==(const KeyIndex& other) const
+    {
+        if (count_ != other.count_)
+            return false;
+        for (const Slot& slot : slots_)
+            if (slot.position != 0 && other.Find(KeyOf(slot)) != slot.position - 1)
+                return false;
+        return true;
+    }
+
+private:
+    struct Slot {
+        std::size_t position = 0; // position + 1; 0 for an empty slot
+        std::size_t offset = 0;
+        std::uint32_t hash = 0;
+        std::uint32_t length = 0;
+    };
+
+    static std::uint32_t Hash(std::string_view key)
+    {
+        return static_cast<std::uint32_t>(std::hash<std::string_view>{}(key));
+    }
+    std::string_view KeyOf(const Slot& slot) const { return std::string_view(keys_).substr(slot.offset, slot.length); }
+
+    // The slot holding the key, or the empty slot where it would go.
+    std::size_t SlotOf(std::string_view key, std::uint32_t hash) const
+    {
+        const std::size_t mask = slots_.size() - 1;
+        for (std::size_t i = hash & mask;; i = (i + 1) & mask) {
+            const Slot& slot = slots_[i];
+            if (slot.position == 0 || (slot.hash == hash && slot.length == key.size() && KeyOf(slot) == key))
+                return i;
+        }
+    }
+
+    void Grow()
+    {
+        std::vector<Slot> old(std::max<std::size_t>(16, 2 * slots_.size()));
+        old.swap(slots_);
+        const std::size_t mask = slots_.size() - 1;
+        for (const Slot& slot : old) {
+            if (slot.position == 0)
+                continue;
+            std::size_t i = slot.hash & mask;
+            while (slots_[i].position != 0)
+                i = (i + 1) & mask;
+            slots_[i] = slot;
+        }
+    }
+
+    std::vector<Slot> slots_;
+    std::string keys_;
+    std::size_t count_ = 0;
+};
+
 using CodeIndex = std::unordered_map<std::string, CodeNumbers>;
 
 void AddKey(KeyIndex& keys, const CZodEVIArticle& article, std::size_t position)
 {
-    keys.try_emplace(FoldCase(article.quantityKey), position);
+    keys.Add(FoldCase(article.quantityKey), position);
 }
 
 void AddCode(CodeIndex& codes, const CZodEVIArticle& article)
@@ -136,16 +228,16 @@ CZodEVIFound CZodEVIGroup::FindByQuantityKey(std::string_view quantityKey) const
 {
     Indexes& built = Built();
     if (!built.keysBuilt) {
-        built.keys.reserve(articles_.size());
+        built.keys.Reserve(articles_.size());
         for (std::size_t i = 0; i < articles_.size(); ++i)
             if (articles_[i] != nullptr)
                 AddKey(built.keys, *articles_[i], i);
         built.keysBuilt = true;
     }
-    const auto found = built.keys.find(FoldCase(quantityKey));
-    if (found == built.keys.end())
+    const std::size_t position = built.keys.Find(FoldCase(quantityKey));
+    if (position == KeyIndex::npos)
         return {};
-    return {static_cast<long>(found->second), articles_[found->second]};
+    return {static_cast<long>(position), articles_[position]};
 }
 
 int CZodEVIGroup::FreeCodeNumber(std::string_view prefix) const

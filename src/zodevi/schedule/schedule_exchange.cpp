@@ -157,12 +157,19 @@ bool Read(CZodEVIBdr& bdr)
     ReturnedArticles delivered;
     if (CallMetre<VtMetre_RemplitTableauFn>("VtMetre_RemplitTableau", std::string(bdr.path), &delivered.list, 1) != 0)
         return false;
+    CZodEVIGroup* group = nullptr;
+    const std::string* groupKey = nullptr;
     for (CZodEVIArticle*& raw : delivered.list) {
         if (raw == nullptr)
             continue;
         CZodEVIArticle* article = bdr.AddArticle(std::unique_ptr<CZodEVIArticle>(raw));
         raw = nullptr;
-        bdr.GroupOf(article->groupKey, true)->push_back(article);
+        // Files keep a group's articles together: the previous article's group is usually
+        // the one.
+        if (groupKey == nullptr || *groupKey != article->groupKey)
+            group = bdr.GroupOf(article->groupKey, true);
+        groupKey = &article->groupKey;
+        group->push_back(article);
     }
     AddProjectWideArticles(bdr);
     return true;

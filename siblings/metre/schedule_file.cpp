@@ -11,6 +11,7 @@
 #include <charconv>
 #include <climits>
 #include <cmath>
+#include <cstdint>
 #include <cstring>
 #include <fcntl.h>
 #include <filesystem>
@@ -73,20 +74,52 @@ const std::unordered_map<std::string_view, std::size_t>& FieldIndex()
     return index;
 }
 
-// The field of an attribute name: the next field in file order is tried first, since
-// files come with the fields in their order; any other name goes through the table.
-std::size_t FieldOf(const char* name, std::size_t expected)
+// A field name as two words, zero after its NUL, and the masks of its bytes with the
+// NUL: a name read as two words matches when its masked words are these.
+struct PackedName {
+    std::uint64_t word[2] = {};
+    std::uint64_t mask[2] = {};
+    bool fits = false; // the name and its NUL take at most 16 bytes
+};
+
+const std::array<PackedName, 48>& PackedNames()
 {
-    const auto& fields = ArticleFields();
-    if (expected < fields.size()) {
-        const char* a = name;
-        const char* b = fields[expected].name;
-        while (*a == *b && *a != '\0') {
-            ++a;
-            ++b;
+    static const std::array<PackedName, 48> packed = [] {
+        std::array<PackedName, 48> all{};
+        for (std::size_t i = 0; i < all.size(); ++i) {
+            const char* name = ArticleFields()[i].name;
+            unsigned char bytes[16] = {};
+            unsigned char mask[16] = {};
+            const std::size_t length = std::min<std::size_t>(std::strlen(name), 15);
+            all[i].fits = std::strlen(name) <= 15;
+            std::memcpy(bytes, name, length);
+            std::memset(mask, 0xFF, length + 1);
+            std::memcpy(all[i].word, bytes, 16);
+            std::memcpy(all[i].mask, mask, 16);
         }
-        if (*a == *b)
+        return all;
+    }();
+    return packed;
+}
+
+// The field of an attribute name: the next field in file order is tried first, since
+// files come with the fields in their order, comparing two words at once where the
+// parsed text lets them be read; any other name goes through the table.
+inline std::size_t FieldOf(const char* name, std::size_t expected, std::string_view parsed,
+                           const std::array<CZodEVIArticleField, 48>& fields, const std::array<PackedName, 48>& names)
+{
+    if (expected < fields.size()) {
+        const PackedName& packed = names[expected];
+        const auto at = reinterpret_cast<std::uintptr_t>(name);
+        const auto begin = reinterpret_cast<std::uintptr_t>(parsed.data());
+        if (packed.fits && at >= begin && at - begin + 16 <= parsed.size()) {
+            std::uint64_t word[2];
+            std::memcpy(word, name, 16);
+            if ((word[0] & packed.mask[0]) == packed.word[0] && (word[1] & packed.mask[1]) == packed.word[1])
+                return expected;
+        } else if (std::strcmp(name, fields[expected].name) == 0) {
             return expected;
+        }
     }
     const auto& index = FieldIndex();
     const auto found = index.find(name);
@@ -151,18 +184,12 @@ bool SetFieldValue(CZodEVIArticle& article, const CZodEVIArticleField& field, co
 // Longest text a real or an integer field takes.
 constexpr std::size_t kNumberRoom = 40;
 
-// "%g" where that is exact and has no exponent, else the shortest text that reads back
-// equal, fixed for ordinary magnitudes: the rule of FormatRealShortest, written without
-// printf or the locale.
+// FormatRealShortest's text without printf or the locale. Its "%g", taken when exact
+// and without exponent, only occurs between 1e-4 and 1e6, where a double holds at most
+// one decimal of six digits: it is then the shortest exact text too. So the shortest
+// form alone gives the same bytes (fixed for ordinary magnitudes).
 char* WriteReal(char* out, double value)
 {
-    const auto g = std::to_chars(out, out + kNumberRoom, value, std::chars_format::general, 6);
-    if (std::find(out, g.ptr, 'e') == g.ptr) {
-        double back = 0;
-        const auto read = std::from_chars(out, g.ptr, back);
-        if (read.ec == std::errc() && read.ptr == g.ptr && back == value)
-            return g.ptr;
-    }
     const double magnitude = std::fabs(value);
     const bool fixed = magnitude >= 1e-5 && magnitude < 1e17;
     return (fixed ? std::to_chars(out, out + kNumberRoom, value, std::chars_format::fixed)
@@ -188,11 +215,10 @@ public:
                 room += (article.*field.text).size() * kWorstEscape;
         char* p = Room(room);
         p = Put(p, "  <article");
-        for (const CZodEVIArticleField& field : ArticleFields()) {
-            *p++ = ' ';
-            p = Put(p, field.name);
-            *p++ = '=';
-            *p++ = '"';
+        const auto& fields = ArticleFields();
+        for (std::size_t i = 0; i < fields.size(); ++i) {
+            const CZodEVIArticleField& field = fields[i];
+            p = Put(p, kOpenings[i]);
             switch (field.type) {
             case CZodEVIArticleField::Type::Text:
                 p = PutEscaped(p, article.*field.text);
@@ -225,6 +251,13 @@ private:
         return room;
     }
     inline static const std::size_t kArticleOverhead = Overhead();
+    // ' name="' of each field.
+    inline static const std::array<std::string, 48> kOpenings = [] {
+        std::array<std::string, 48> openings;
+        for (std::size_t i = 0; i < openings.size(); ++i)
+            openings[i] = std::string(" ") + ArticleFields()[i].name + "=\"";
+        return openings;
+    }();
 
     // At least `room` writable bytes at the end of the text; the buffer is not zeroed.
     char* Room(std::size_t room)
@@ -436,6 +469,8 @@ FileResult ReadArticles(char* buffer, std::size_t size, std::string_view text, c
                                                 name.c_str(), LineOfOffset(text, root.offset_debug()), kScheduleRoot,
                                                 root.name()));
     const auto& fields = ArticleFields();
+    const auto& packedNames = PackedNames();
+    const std::string_view parsedText(buffer, size);
     ArticleVector read;
     for (pugi::xml_node node = root.first_child(); node; node = node.next_sibling()) {
         // Counting lines is only worth it for a message: it would make reading quadratic.
@@ -449,11 +484,16 @@ FileResult ReadArticles(char* buffer, std::size_t size, std::string_view text, c
         auto article = std::make_unique<CZodEVIArticle>();
         std::uint64_t seen = 0;
         std::size_t expected = 0;
-        for (pugi::xml_attribute attribute = node.first_attribute(); attribute; attribute = attribute.next_attribute()) {
-            const std::size_t position = FieldOf(attribute.name(), expected);
+        // An attribute's name is never empty, so the empty name that pugixml gives past the
+        // last one ends the walk without one more call per attribute.
+        for (pugi::xml_attribute attribute = node.first_attribute();; attribute = attribute.next_attribute()) {
+            const char* attributeName = attribute.name();
+            if (*attributeName == '\0')
+                break;
+            const std::size_t position = FieldOf(attributeName, expected, parsedText, fields, packedNames);
             if (position == fields.size())
                 return FileResult::Failure(FormatString("Bordereau « %s », ligne %d : article %zu, champ inconnu « %s ».",
-                                                        name.c_str(), lineOf(), read.size() + 1, attribute.name()));
+                                                        name.c_str(), lineOf(), read.size() + 1, attributeName));
             if (seen & (std::uint64_t{1} << position))
                 return FileResult::Failure(FormatString("Bordereau « %s », ligne %d : article %zu, champ « %s » en double.",
                                                         name.c_str(), lineOf(), read.size() + 1, attribute.name()));

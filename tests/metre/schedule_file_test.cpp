@@ -128,11 +128,14 @@ std::vector<CZodEVIArticle> Varied(std::size_t count)
     for (CZodEVIArticle& a : articles) {
         for (const CZodEVIArticleField& field : ArticleFields()) {
             const unsigned kind = random() % 4;
+            // Round numbers of every magnitude and their neighbours: where "%g", fixed and
+            // exponent forms part.
+            const double round = static_cast<double>(random() % 9 + 1) * std::pow(10.0, static_cast<int>(random() % 30) - 10);
             switch (field.type) {
             case CZodEVIArticleField::Type::Real:
                 a.*field.real = kind == 0 ? std::bit_cast<double>(random())
                               : kind == 1 ? static_cast<double>(random() % 100000) / 100
-                              : kind == 2 ? static_cast<double>(static_cast<int>(random() % 2000) - 1000)
+                              : kind == 2 ? (random() % 3 == 0 ? round : std::nextafter(round, random() % 2 ? 0.0 : HUGE_VAL))
                                           : std::ldexp(static_cast<double>(random() % 1000), static_cast<int>(random() % 140) - 70);
                 break;
             case CZodEVIArticleField::Type::Int:

@@ -1,7 +1,10 @@
 // Update network with 200 pipe models and 10 depth bounds into schedules of 1,000 to
 // 100,000 articles: a new network (every article created), the same update repeated
-// (nothing created, with and without purge), and growth with the network's own size.
+// (nothing created, with and without purge), and growth with the network's own size,
+// with the ratios to the 450-article network.
 #include "generation/network_update.hpp"
+
+#include "ratio_reporter.hpp"
 
 #include "text/text.hpp"
 
@@ -94,7 +97,8 @@ void BM_UpdateNetworkRepeat(benchmark::State& state)
 }
 
 // Growth with the network's own group: the same repeated update with more models, in a
-// schedule of 10,000 articles.
+// schedule of 10,000 articles. 200 models make a group of 450 articles, 12,475 one of
+// 25,000.
 void BM_UpdateNetworkGroupSize(benchmark::State& state)
 {
     const auto models = Models(static_cast<int>(state.range(0)));
@@ -112,8 +116,17 @@ BENCHMARK(BM_UpdateNetworkRepeat)
     ->ArgsProduct({{1000, 10000, 100000}, {0, 1}})
     ->ArgNames({"articles", "purge"})
     ->Unit(benchmark::kMillisecond);
-BENCHMARK(BM_UpdateNetworkGroupSize)->Arg(200)->Arg(800)->Arg(3200)->Unit(benchmark::kMillisecond);
+BENCHMARK(BM_UpdateNetworkGroupSize)->Arg(200)->Arg(800)->Arg(3200)->Arg(12475)->Unit(benchmark::kMillisecond);
 
 } // namespace
 
-BENCHMARK_MAIN();
+int main(int argc, char** argv)
+{
+    return RunWithRatios(argc, argv,
+                         {{"repeat, group 1,650 / 450", "BM_UpdateNetworkGroupSize/800", "BM_UpdateNetworkGroupSize/200"},
+                          {"repeat, group 6,450 / 450", "BM_UpdateNetworkGroupSize/3200", "BM_UpdateNetworkGroupSize/200"},
+                          {"repeat, group 25,000 / 450", "BM_UpdateNetworkGroupSize/12475",
+                           "BM_UpdateNetworkGroupSize/200"},
+                          {"new network, 100,000 / 1,000 articles", "BM_UpdateNetworkNew/100000",
+                           "BM_UpdateNetworkNew/1000"}});
+}

@@ -6,13 +6,15 @@
 
 #include <pugixml.hpp>
 
+#include <algorithm>
 #include <cerrno>
+#include <charconv>
 #include <climits>
+#include <cmath>
+#include <cstdint>
 #include <cstring>
 #include <fcntl.h>
 #include <filesystem>
-#include <fstream>
-#include <sstream>
 #include <sys/stat.h>
 #include <unistd.h>
 #include <unordered_map>
@@ -72,10 +74,280 @@ const std::unordered_map<std::string_view, std::size_t>& FieldIndex()
     return index;
 }
 
-struct StringWriter : pugi::xml_writer {
-    std::string out;
-    void write(const void* data, std::size_t size) override { out.append(static_cast<const char*>(data), size); }
+// A field name as two words, zero after its NUL, and the masks of its bytes with the
+// NUL: a name read as two words matches when its masked words are these.
+struct PackedName {
+    std::uint64_t word[2] = {};
+    std::uint64_t mask[2] = {};
+    bool fits = false; // the name and its NUL take at most 16 bytes
 };
+
+const std::array<PackedName, 48>& PackedNames()
+{
+    static const std::array<PackedName, 48> packed = [] {
+        std::array<PackedName, 48> all{};
+        for (std::size_t i = 0; i < all.size(); ++i) {
+            const char* name = ArticleFields()[i].name;
+            unsigned char bytes[16] = {};
+            unsigned char mask[16] = {};
+            const std::size_t length = std::min<std::size_t>(std::strlen(name), 15);
+            all[i].fits = std::strlen(name) <= 15;
+            std::memcpy(bytes, name, length);
+            std::memset(mask, 0xFF, length + 1);
+            std::memcpy(all[i].word, bytes, 16);
+            std::memcpy(all[i].mask, mask, 16);
+        }
+        return all;
+    }();
+    return packed;
+}
+
+// The field of an attribute name: the next field in file order is tried first, since
+// files come with the fields in their order, comparing two words at once where the
+// parsed text lets them be read; any other name goes through the table.
+inline std::size_t FieldOf(const char* name, std::size_t expected, std::string_view parsed,
+                           const std::array<CZodEVIArticleField, 48>& fields, const std::array<PackedName, 48>& names)
+{
+    if (expected < fields.size()) {
+        const PackedName& packed = names[expected];
+        const auto at = reinterpret_cast<std::uintptr_t>(name);
+        const auto begin = reinterpret_cast<std::uintptr_t>(parsed.data());
+        if (packed.fits && at >= begin && at - begin + 16 <= parsed.size()) {
+            std::uint64_t word[2];
+            std::memcpy(word, name, 16);
+            if ((word[0] & packed.mask[0]) == packed.word[0] && (word[1] & packed.mask[1]) == packed.word[1])
+                return expected;
+        } else if (std::strcmp(name, fields[expected].name) == 0) {
+            return expected;
+        }
+    }
+    const auto& index = FieldIndex();
+    const auto found = index.find(name);
+    return found == index.end() ? fields.size() : found->second;
+}
+
+// Digits only, with an optional minus: the form of nearly every number in a file, read
+// without from_chars. Anything else answers false and takes the general path.
+bool ReadPlainInteger(const char* text, bool& negative, std::uint64_t& value, int maxDigits)
+{
+    negative = *text == '-';
+    if (negative)
+        ++text;
+    value = 0;
+    int digits = 0;
+    for (; *text >= '0' && *text <= '9'; ++text, ++digits) {
+        if (digits == maxDigits)
+            return false;
+        value = value * 10 + static_cast<unsigned>(*text - '0');
+    }
+    return digits != 0 && *text == '\0';
+}
+
+// SetFieldText for a value of the file, with the common forms read directly; the rules
+// stay those of SetFieldText, which takes every other case.
+bool SetFieldValue(CZodEVIArticle& article, const CZodEVIArticleField& field, const char* value)
+{
+    bool negative = false;
+    std::uint64_t n = 0;
+    switch (field.type) {
+    case CZodEVIArticleField::Type::Text:
+        // Most texts of a file are empty, and a field is read once, still empty.
+        if (*value != '\0')
+            article.*field.text = value;
+        return true;
+    case CZodEVIArticleField::Type::Real:
+        // Up to 15 digits a whole number is exact as a double; "-0" stays negative.
+        if (ReadPlainInteger(value, negative, n, 15)) {
+            article.*field.real = negative ? -static_cast<double>(n) : static_cast<double>(n);
+            return true;
+        }
+        // Whatever from_chars reads whole, ParseReal reads the same.
+        if (const char* end = value + std::strlen(value); end != value) {
+            double real = 0;
+            const auto result = std::from_chars(value, end, real);
+            if (result.ec == std::errc() && result.ptr == end) {
+                article.*field.real = real;
+                return true;
+            }
+        }
+        break;
+    case CZodEVIArticleField::Type::Int:
+        if (ReadPlainInteger(value, negative, n, 9)) {
+            article.*field.integer = negative ? -static_cast<int>(n) : static_cast<int>(n);
+            return true;
+        }
+        break;
+    }
+    return SetFieldText(article, field, value);
+}
+
+// Longest text a real or an integer field takes.
+constexpr std::size_t kNumberRoom = 40;
+
+// FormatRealShortest's text without printf or the locale. Its "%g", taken when exact
+// and without exponent, only occurs between 1e-4 and 1e6, where a double holds at most
+// one decimal of six digits: it is then the shortest exact text too. So the shortest
+// form alone gives the same bytes (fixed for ordinary magnitudes).
+char* WriteReal(char* out, double value)
+{
+    const double magnitude = std::fabs(value);
+    const bool fixed = magnitude >= 1e-5 && magnitude < 1e17;
+    return (fixed ? std::to_chars(out, out + kNumberRoom, value, std::chars_format::fixed)
+                  : std::to_chars(out, out + kNumberRoom, value))
+        .ptr;
+}
+
+// The schedule's text as pugixml would save the document of its articles (indented by
+// two spaces, self-closed elements, the attribute escapes below), written straight into
+// one buffer instead of a document that is then serialised.
+class ScheduleWriter {
+public:
+    explicit ScheduleWriter(std::size_t expected)
+        : text_(std::make_unique_for_overwrite<char[]>(expected)), capacity_(expected)
+    {
+    }
+
+    void Article(const CZodEVIArticle& article)
+    {
+        std::size_t room = kArticleOverhead;
+        for (const CZodEVIArticleField& field : ArticleFields())
+            if (field.type == CZodEVIArticleField::Type::Text)
+                room += (article.*field.text).size() * kWorstEscape;
+        char* p = Room(room);
+        p = Put(p, "  <article");
+        const auto& fields = ArticleFields();
+        for (std::size_t i = 0; i < fields.size(); ++i) {
+            const CZodEVIArticleField& field = fields[i];
+            p = Put(p, kOpenings[i]);
+            switch (field.type) {
+            case CZodEVIArticleField::Type::Text:
+                p = PutEscaped(p, article.*field.text);
+                break;
+            case CZodEVIArticleField::Type::Real:
+                p = WriteReal(p, article.*field.real);
+                break;
+            case CZodEVIArticleField::Type::Int:
+                p = std::to_chars(p, p + kNumberRoom, article.*field.integer).ptr;
+                break;
+            }
+            *p++ = '"';
+        }
+        p = Put(p, " />\n");
+        Commit(p);
+    }
+
+    void Raw(std::string_view text) { Commit(Put(Room(text.size()), text)); }
+
+    std::string_view Text() const { return {text_.get(), used_}; }
+
+private:
+    // Every escape below is at most six bytes for one.
+    static constexpr std::size_t kWorstEscape = 6;
+    static std::size_t Overhead()
+    {
+        std::size_t room = 16;
+        for (const CZodEVIArticleField& field : ArticleFields())
+            room += std::strlen(field.name) + 4 + kNumberRoom;
+        return room;
+    }
+    inline static const std::size_t kArticleOverhead = Overhead();
+    // ' name="' of each field.
+    inline static const std::array<std::string, 48> kOpenings = [] {
+        std::array<std::string, 48> openings;
+        for (std::size_t i = 0; i < openings.size(); ++i)
+            openings[i] = std::string(" ") + ArticleFields()[i].name + "=\"";
+        return openings;
+    }();
+
+    // At least `room` writable bytes at the end of the text; the buffer is not zeroed.
+    char* Room(std::size_t room)
+    {
+        if (capacity_ - used_ < room) {
+            capacity_ = std::max(capacity_ * 2, used_ + room);
+            auto larger = std::make_unique_for_overwrite<char[]>(capacity_);
+            std::memcpy(larger.get(), text_.get(), used_);
+            text_ = std::move(larger);
+        }
+        return text_.get() + used_;
+    }
+    void Commit(const char* end) { used_ = static_cast<std::size_t>(end - text_.get()); }
+
+    static char* Put(char* p, std::string_view text)
+    {
+        std::memcpy(p, text.data(), text.size());
+        return p + text.size();
+    }
+
+    // pugixml's escapes in a double-quoted attribute: & < " and the control characters,
+    // these as two-digit references; > and ' stay. The value ends at a NUL, as the
+    // document's copy of c_str() did.
+    static char* PutEscaped(char* p, const std::string& text)
+    {
+        const char* s = text.c_str();
+        for (;;) {
+            const char* plain = s;
+            while (!IsSpecial(*s))
+                ++s;
+            p = Put(p, std::string_view(plain, static_cast<std::size_t>(s - plain)));
+            const auto c = static_cast<unsigned char>(*s++);
+            switch (c) {
+            case '\0':
+                return p;
+            case '&':
+                p = Put(p, "&amp;");
+                break;
+            case '<':
+                p = Put(p, "&lt;");
+                break;
+            case '"':
+                p = Put(p, "&quot;");
+                break;
+            default:
+                p = Put(p, "&#");
+                *p++ = static_cast<char>('0' + c / 10);
+                *p++ = static_cast<char>('0' + c % 10);
+                *p++ = ';';
+                break;
+            }
+        }
+    }
+    static bool IsSpecial(char c)
+    {
+        const auto u = static_cast<unsigned char>(c);
+        return u < 32 || u == '&' || u == '<' || u == '"';
+    }
+
+    std::unique_ptr<char[]> text_;
+    std::size_t capacity_ = 0;
+    std::size_t used_ = 0;
+};
+
+// The whole text of the file for these articles.
+ScheduleWriter WriteSchedule(const std::vector<const CZodEVIArticle*>& articles)
+{
+    // Without escapes the text is about the sum of the fields: enough room, known ahead.
+    std::size_t expected = 64;
+    for (const CZodEVIArticle* article : articles) {
+        if (article == nullptr)
+            continue;
+        expected += 1024;
+        for (const CZodEVIArticleField& field : ArticleFields())
+            if (field.type == CZodEVIArticleField::Type::Text)
+                expected += (article->*field.text).size();
+    }
+    ScheduleWriter writer(expected);
+    writer.Raw("<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n");
+    if (std::none_of(articles.begin(), articles.end(), [](const CZodEVIArticle* a) { return a != nullptr; })) {
+        writer.Raw(FormatString("<%s />\n", kScheduleRoot));
+        return writer;
+    }
+    writer.Raw(FormatString("<%s>\n", kScheduleRoot));
+    for (const CZodEVIArticle* article : articles)
+        if (article != nullptr)
+            writer.Article(*article);
+    writer.Raw(FormatString("</%s>\n", kScheduleRoot));
+    return writer;
+}
 
 std::string ErrnoText(int error)
 {
@@ -177,11 +449,16 @@ std::string FieldText(const CZodEVIArticle& article, const CZodEVIArticleField& 
 }
 
 
-FileResult ReadScheduleText(std::string_view text, const std::string& name, ArticleVector& out)
+namespace {
+
+// Parses `buffer` in place (pugixml writes into it) and appends its articles to `out`
+// when all of it reads. Messages count lines in `text`, the buffer as it was.
+FileResult ReadArticles(char* buffer, std::size_t size, std::string_view text, const std::string& name,
+                        ArticleVector& out)
 {
     pugi::xml_document document;
     const pugi::xml_parse_result parsed =
-        document.load_buffer(text.data(), text.size(), pugi::parse_minimal | pugi::parse_escapes);
+        document.load_buffer_inplace(buffer, size, pugi::parse_minimal | pugi::parse_escapes);
     if (!parsed)
         return FileResult::Failure(FormatString("Bordereau « %s », ligne %d : %s.", name.c_str(),
                                                 LineOfOffset(text, parsed.offset), ParseProblem(parsed).c_str()));
@@ -192,7 +469,8 @@ FileResult ReadScheduleText(std::string_view text, const std::string& name, Arti
                                                 name.c_str(), LineOfOffset(text, root.offset_debug()), kScheduleRoot,
                                                 root.name()));
     const auto& fields = ArticleFields();
-    const auto& index = FieldIndex();
+    const auto& packedNames = PackedNames();
+    const std::string_view parsedText(buffer, size);
     ArticleVector read;
     for (pugi::xml_node node = root.first_child(); node; node = node.next_sibling()) {
         // Counting lines is only worth it for a message: it would make reading quadratic.
@@ -206,21 +484,21 @@ FileResult ReadScheduleText(std::string_view text, const std::string& name, Arti
         auto article = std::make_unique<CZodEVIArticle>();
         std::uint64_t seen = 0;
         std::size_t expected = 0;
-        for (pugi::xml_attribute attribute = node.first_attribute(); attribute; attribute = attribute.next_attribute()) {
-            // Files come with the fields in their order: try the next one before the map.
-            std::size_t position = expected;
-            if (position >= fields.size() || std::strcmp(fields[position].name, attribute.name()) != 0) {
-                const auto found = index.find(attribute.name());
-                if (found == index.end())
-                    return FileResult::Failure(FormatString("Bordereau « %s », ligne %d : article %zu, champ inconnu « %s ».",
-                                                            name.c_str(), lineOf(), read.size() + 1, attribute.name()));
-                position = found->second;
-            }
+        // An attribute's name is never empty, so the empty name that pugixml gives past the
+        // last one ends the walk without one more call per attribute.
+        for (pugi::xml_attribute attribute = node.first_attribute();; attribute = attribute.next_attribute()) {
+            const char* attributeName = attribute.name();
+            if (*attributeName == '\0')
+                break;
+            const std::size_t position = FieldOf(attributeName, expected, parsedText, fields, packedNames);
+            if (position == fields.size())
+                return FileResult::Failure(FormatString("Bordereau « %s », ligne %d : article %zu, champ inconnu « %s ».",
+                                                        name.c_str(), lineOf(), read.size() + 1, attributeName));
             if (seen & (std::uint64_t{1} << position))
                 return FileResult::Failure(FormatString("Bordereau « %s », ligne %d : article %zu, champ « %s » en double.",
                                                         name.c_str(), lineOf(), read.size() + 1, attribute.name()));
             seen |= std::uint64_t{1} << position;
-            if (!SetFieldText(*article, fields[position], attribute.value()))
+            if (!SetFieldValue(*article, fields[position], attribute.value()))
                 return FileResult::Failure(FormatString(
                     "Bordereau « %s », ligne %d : article %zu, champ « %s » : %s attendu, « %s » trouvé.", name.c_str(),
                     lineOf(), read.size() + 1, attribute.name(),
@@ -234,47 +512,70 @@ FileResult ReadScheduleText(std::string_view text, const std::string& name, Arti
                                                     read.size() + 1, kScheduleArticle));
         read.push_back(std::move(article));
     }
+    out.reserve(out.size() + read.size());
     out.insert(out.end(), std::make_move_iterator(read.begin()), std::make_move_iterator(read.end()));
     return {};
 }
 
-FileResult ReadScheduleFile(const std::string& path, ArticleVector& out)
+// The whole file in one piece, not zeroed first: large schedules are read many times a
+// session.
+FileResult ReadWholeFile(const std::string& path, std::unique_ptr<char[]>& data, std::size_t& size)
 {
     std::error_code error;
     if (!std::filesystem::exists(path, error))
         return FileResult::Failure(FormatString("Bordereau « %s » : fichier introuvable.", path.c_str()));
     if (std::filesystem::is_directory(path, error))
         return FileResult::Failure(FormatString("Bordereau « %s » : c'est un dossier, pas un fichier.", path.c_str()));
-    std::ifstream in(path, std::ios::binary);
-    if (!in.is_open())
+    const int fd = ::open(path.c_str(), O_RDONLY | O_CLOEXEC);
+    if (fd < 0)
         return FileResult::Failure(FormatString("Bordereau « %s » : ouverture impossible (%s).", path.c_str(),
                                                 ErrnoText(errno).c_str()));
-    // One read of the whole file: large schedules are read many times a session.
-    std::string content(static_cast<std::size_t>(std::filesystem::file_size(path, error)), '\0');
-    in.read(content.data(), static_cast<std::streamsize>(content.size()));
-    if (error || in.gcount() != static_cast<std::streamsize>(content.size()))
+    struct stat status {};
+    // Only a regular file has a size to read.
+    bool whole = ::fstat(fd, &status) == 0 && S_ISREG(status.st_mode);
+    size = whole ? static_cast<std::size_t>(status.st_size) : 0;
+    data = std::make_unique_for_overwrite<char[]>(size + 1);
+    std::size_t done = 0;
+    while (whole && done < size) {
+        const ssize_t got = ::read(fd, data.get() + done, size - done);
+        if (got < 0 && errno == EINTR)
+            continue;
+        whole = got > 0;
+        done += whole ? static_cast<std::size_t>(got) : 0;
+    }
+    ::close(fd);
+    if (!whole)
         return FileResult::Failure(FormatString("Bordereau « %s » : lecture impossible.", path.c_str()));
-    return ReadScheduleText(content, path, out);
+    return {};
+}
+
+} // namespace
+
+FileResult ReadScheduleText(std::string_view text, const std::string& name, ArticleVector& out)
+{
+    auto copy = std::make_unique_for_overwrite<char[]>(text.size() + 1);
+    std::memcpy(copy.get(), text.data(), text.size());
+    return ReadArticles(copy.get(), text.size(), text, name, out);
+}
+
+FileResult ReadScheduleFile(const std::string& path, ArticleVector& out)
+{
+    std::unique_ptr<char[]> data;
+    std::size_t size = 0;
+    if (FileResult read = ReadWholeFile(path, data, size); !read)
+        return read;
+    if (ReadArticles(data.get(), size, std::string_view(data.get(), size), path, out))
+        return {};
+    // Parsing in place rewrote the text its lines were to be counted in: the message
+    // comes from a second reading of the file, which errors alone pay for.
+    if (FileResult read = ReadWholeFile(path, data, size); !read)
+        return read;
+    return ReadScheduleText(std::string_view(data.get(), size), path, out);
 }
 
 std::string ScheduleToXml(const std::vector<const CZodEVIArticle*>& articles)
 {
-    pugi::xml_document document;
-    pugi::xml_node declaration = document.append_child(pugi::node_declaration);
-    declaration.append_attribute("version").set_value("1.0");
-    declaration.append_attribute("encoding").set_value("UTF-8");
-    pugi::xml_node root = document.append_child(kScheduleRoot);
-    const auto& fields = ArticleFields();
-    for (const CZodEVIArticle* article : articles) {
-        if (article == nullptr)
-            continue;
-        pugi::xml_node node = root.append_child(kScheduleArticle);
-        for (const CZodEVIArticleField& field : fields)
-            node.append_attribute(field.name).set_value(FieldText(*article, field).c_str());
-    }
-    StringWriter writer;
-    document.save(writer, "  ", pugi::format_indent, pugi::encoding_utf8);
-    return std::move(writer.out);
+    return std::string(WriteSchedule(articles).Text());
 }
 
 FileResult WriteFileAtomically(const std::string& path, std::string_view content, bool keepBackup)
@@ -320,7 +621,8 @@ FileResult WriteScheduleFile(const std::string& path, const std::vector<const CZ
 {
     if (path.empty())
         return FileResult::Failure("Bordereau sans nom de fichier : rien n'est écrit.");
-    FileResult result = WriteFileAtomically(path, ScheduleToXml(articles), true);
+    const ScheduleWriter text = WriteSchedule(articles);
+    FileResult result = WriteFileAtomically(path, text.Text(), true);
     if (!result)
         result.message = "Bordereau : " + result.message;
     return result;

@@ -3,8 +3,11 @@
 // parentheses and format characters.
 #include "generation/network_update.hpp"
 
+#include "text/text.hpp"
+
 #include <gtest/gtest.h>
 
+#include <set>
 #include <string>
 #include <vector>
 
@@ -209,6 +212,48 @@ TEST(UpdateNetwork, DepthPurgeKeepsMaterialsThatLookLikeClasses)
     Update(bdr, 1, "EU 1", {}, materials, {1.50, 2.50, 3.00});
     EXPECT_NE(ByKey(bdr, "EU 1", "RSX_VOL_2.50"), nullptr);
     EXPECT_NE(ByKey(bdr, "EU 1", "RSX_VOL_3.00"), nullptr);
+}
+
+// Updates, purges and an article edited by hand in between, on the indexes the updates
+// leave behind: after each step the indexes agree with a scan, and a key the user gave
+// an article is found by the next update instead of being made twice.
+TEST(UpdateNetwork, IndexesStayExactThroughUpdatesPurgesAndEdits)
+{
+    PurgeFlag flag(true);
+    CZodEVIBdr bdr;
+    const auto step = [&](const char* what, const auto& run) {
+        SCOPED_TRACE(what);
+        run();
+        EXPECT_EQ(bdr.CheckIndexes(), "");
+    };
+    step("new network", [&] { Update(bdr, 1, "EU 1", {"PVC 200", "PVC 300"}, {"Grave"}, {1.30, 2.00}); });
+    step("purge a model and a class", [&] { Update(bdr, 1, "EU 1", {"PVC 300"}, {"Grave"}, {1.30}); });
+    step("edited by hand", [&] {
+        CZodEVIArticle* pipe = const_cast<CZodEVIArticle*>(ByKey(bdr, "EU 1", "RSX_TUY_LIN_3D_PVC 300"));
+        ASSERT_NE(pipe, nullptr);
+        CZodEVIArticle edited = *pipe;
+        edited.quantityKey = MakeQuantityKey("RSX_TUY_LIN_3D_pvc 400");
+        edited.code = "eu-999";
+        bdr.ReplaceArticle(*pipe, edited);
+    });
+    step("the edited key is met", [&] { Update(bdr, 1, "EU 1", {"PVC 400"}, {"Grave"}, {1.30}); });
+    step("depth classes", [&] { UpdateDepthClasses(bdr, {1.30, 2.50}); });
+    step("codes up to the edited one", [&] {
+        Names models = {"PVC 400"};
+        for (int i = 0; i < 500; ++i)
+            models.push_back("M" + std::to_string(i));
+        Update(bdr, 1, "EU 1", models);
+    });
+    // Neither a key nor a code was given twice.
+    std::set<std::string> keys, codes;
+    for (const CZodEVIArticle* article : GroupOf(bdr, "EU 1")) {
+        EXPECT_TRUE(keys.insert(FoldCase(article->quantityKey)).second || article->quantityKey == "\"\"")
+            << article->quantityKey;
+        EXPECT_TRUE(codes.insert(FoldCase(article->code)).second) << article->code;
+    }
+    const CZodEVIArticle* edited = ByKey(bdr, "EU 1", "RSX_TUY_LIN_3D_PVC 400");
+    ASSERT_NE(edited, nullptr);
+    EXPECT_EQ(edited->code, "eu-999");
 }
 
 TEST(UpdateNetwork, NamesAreNeverFormats)

@@ -6,12 +6,16 @@
 #include "text/text.hpp"
 
 #include <gtest/gtest.h>
+#include <pugixml.hpp>
 
+#include <algorithm>
+#include <bit>
 #include <cfloat>
 #include <climits>
 #include <cmath>
 #include <csignal>
 #include <cstring>
+#include <random>
 #include <sys/resource.h>
 
 namespace {
@@ -94,6 +98,124 @@ TEST(ScheduleFile, EveryFieldRoundTrips)
     }
 }
 
+// The file as the document writer made it before the text was written directly: the
+// written text must stay this, byte for byte.
+std::string DocumentText(const std::vector<const CZodEVIArticle*>& articles)
+{
+    pugi::xml_document document;
+    pugi::xml_node declaration = document.append_child(pugi::node_declaration);
+    declaration.append_attribute("version").set_value("1.0");
+    declaration.append_attribute("encoding").set_value("UTF-8");
+    pugi::xml_node root = document.append_child(metre::kScheduleRoot);
+    for (const CZodEVIArticle* article : articles) {
+        if (article == nullptr)
+            continue;
+        pugi::xml_node node = root.append_child(metre::kScheduleArticle);
+        for (const CZodEVIArticleField& field : ArticleFields())
+            node.append_attribute(field.name).set_value(metre::FieldText(*article, field).c_str());
+    }
+    std::ostringstream out;
+    document.save(out, "  ", pugi::format_indent, pugi::encoding_utf8);
+    return out.str();
+}
+
+// Articles whose texts take any byte (NUL and control characters included) and whose
+// numbers take any bit pattern, between plainer prices and counts.
+std::vector<CZodEVIArticle> Varied(std::size_t count)
+{
+    std::mt19937_64 random(count);
+    std::vector<CZodEVIArticle> articles(count);
+    for (CZodEVIArticle& a : articles) {
+        for (const CZodEVIArticleField& field : ArticleFields()) {
+            const unsigned kind = random() % 4;
+            // Round numbers of every magnitude and their neighbours: where "%g", fixed and
+            // exponent forms part.
+            const double round = static_cast<double>(random() % 9 + 1) * std::pow(10.0, static_cast<int>(random() % 30) - 10);
+            switch (field.type) {
+            case CZodEVIArticleField::Type::Real:
+                a.*field.real = kind == 0 ? std::bit_cast<double>(random())
+                              : kind == 1 ? static_cast<double>(random() % 100000) / 100
+                              : kind == 2 ? (random() % 3 == 0 ? round : std::nextafter(round, random() % 2 ? 0.0 : HUGE_VAL))
+                                          : std::ldexp(static_cast<double>(random() % 1000), static_cast<int>(random() % 140) - 70);
+                break;
+            case CZodEVIArticleField::Type::Int:
+                a.*field.integer = kind == 0 ? static_cast<int>(random()) : static_cast<int>(random() % 100);
+                break;
+            case CZodEVIArticleField::Type::Text:
+                if (kind != 0) {
+                    a.*field.text = "Réseau « EU » 'n°" + std::to_string(random() % 1000) + "' & <fin>";
+                    break;
+                }
+                for (std::size_t n = random() % 40; n > 0; --n)
+                    (a.*field.text) += static_cast<char>(random() % 256);
+                break;
+            }
+        }
+    }
+    return articles;
+}
+
+TEST(ScheduleFile, WrittenTextIsTheDocumentsByteForByte)
+{
+    std::vector<CZodEVIArticle> tricky;
+    for (int seed = 0; seed < 7; ++seed)
+        tricky.push_back(Tricky(seed));
+    ArticleVector example;
+    const std::string examplePath = std::string(VEL_TEST_DATA) + "/../../examples/VelaBordereau.xml";
+    ASSERT_TRUE(metre::ReadScheduleFile(examplePath, example));
+    std::vector<CZodEVIArticle> exampleCopy;
+    for (const auto& a : example)
+        exampleCopy.push_back(*a);
+    struct Case {
+        const char* name;
+        std::vector<CZodEVIArticle> articles;
+    };
+    const Case cases[] = {
+        {"none", {}},
+        {"defaults", {CZodEVIArticle()}},
+        {"tricky", tricky},
+        {"example", exampleCopy},
+        {"1k varied", Varied(1000)},
+        {"10k varied", Varied(10000)},
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.name);
+        std::vector<const CZodEVIArticle*> pointers = Pointers(c.articles);
+        pointers.insert(pointers.begin() + static_cast<long>(pointers.size() / 2), nullptr);
+        const std::string written = metre::ScheduleToXml(pointers);
+        EXPECT_TRUE(written == DocumentText(pointers)); // megabytes: no diff printed
+    }
+    std::ifstream in(examplePath, std::ios::binary);
+    const std::string exampleFile{std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>()};
+    EXPECT_EQ(metre::ScheduleToXml(Pointers(exampleCopy)), exampleFile);
+}
+
+// The direct reading of the file's numbers agrees with SetFieldText on every form: the
+// same value to the bit, or the same refusal.
+TEST(ScheduleFile, NumbersReadAsSetFieldTextReadsThem)
+{
+    const char* values[] = {"0", "-0", "007", "42", "-17", "123456789", "1234567890", "-2147483648", "2147483647",
+                            "2147483648", "999999999999999", "9999999999999999", "12345678901234567890", "1.5",
+                            "-0.0", "1e5", "1E-400", "1e400", " 12", "12 ", "\t3\n", "+3", "+-3", "-", "", ".5",
+                            "5.", "0x10", "nan", "-inf", "12,5", "1_000"};
+    const auto& fields = ArticleFields();
+    const auto real = std::find_if(fields.begin(), fields.end(), [](const auto& f) { return f.name == std::string("unitPrice"); });
+    const auto integer = std::find_if(fields.begin(), fields.end(), [](const auto& f) { return f.name == std::string("number"); });
+    for (const char* value : values) {
+        for (const CZodEVIArticleField* field : {&*real, &*integer}) {
+            SCOPED_TRACE(std::string(field->name) + "=\"" + value + "\"");
+            CZodEVIArticle expected;
+            const bool accepted = metre::SetFieldText(expected, *field, value);
+            ArticleVector read;
+            const metre::FileResult result = metre::ReadScheduleText(
+                FormatString("<bordereau><article %s=\"%s\"/></bordereau>", field->name, value), "b.xml", read);
+            ASSERT_EQ(static_cast<bool>(result), accepted) << result.message;
+            if (accepted)
+                ExpectSameFields(expected, *read.at(0));
+        }
+    }
+}
+
 TEST(ScheduleFile, RealsAreWrittenShortAndWithoutLocale)
 {
     CZodEVIArticle a;
@@ -128,6 +250,9 @@ TEST(ScheduleFile, MalformedFilesAreRefusedWithTheirLine)
         {"twice", "<bordereau>\n<article code=\"A\" code=\"B\"/>\n</bordereau>", "champ « code » en double"},
         {"stray element", "<bordereau>\n<article/>\n<ligne/>\n</bordereau>", "ligne 3 : élément <article> attendu, <ligne>"},
         {"truncated", "<bordereau>\n<article code=\"A\"/>\n<article code=\"B\"", "ligne 3"},
+        // Reading rewrites escapes and name ends in place; lines are those of the file.
+        {"lines after escapes", "<bordereau>\n<article\ncode=\"a&#10;b&#10;c&#10;\"\n/>\n<article prix=\"1\"/>\n</bordereau>",
+         "ligne 5 : article 2, champ inconnu « prix »"},
     };
     TempDir dir;
     for (const Case& c : cases) {

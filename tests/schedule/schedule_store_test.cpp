@@ -7,7 +7,9 @@
 #include "text/text.hpp"
 
 #include <gtest/gtest.h>
+#include <algorithm>
 #include <map>
+#include <random>
 
 namespace {
 
@@ -291,6 +293,232 @@ TEST(CZodEVIBdr, NetworkIndexesAndClear)
     EXPECT_TRUE(bdr.Groups().Empty());
     EXPECT_EQ(bdr.path, "/tmp/b.xml");
     EXPECT_EQ(bdr.Catalogue().GetSize(), 53);
+}
+
+// What the group queries answered before they had indexes: scans of the schedule.
+CZodEVIFound ScannedByKey(const CZodEVIGroup& group, const std::string& key)
+{
+    for (std::size_t i = 0; i < group.size(); ++i)
+        if (EqualsNoCase(group[i]->quantityKey, key))
+            return {static_cast<long>(i), group[i]};
+    return {};
+}
+
+std::string ScannedNewCode(const std::string& prefix, const CZodEVIGroup& group)
+{
+    for (int n = 1;; ++n) {
+        const std::string code = FormatString("%s-%03d", prefix.c_str(), n);
+        if (std::none_of(group.begin(), group.end(), [&](const CZodEVIArticle* a) { return EqualsNoCase(a->code, code); }))
+            return code;
+    }
+}
+
+int ScannedNextFree(const CZodEVIBdr& bdr)
+{
+    for (int n = bdr.nextNumber;; ++n)
+        if (std::none_of(bdr.Articles().begin(), bdr.Articles().end(), [&](const auto& a) { return a->number == n; }))
+            return n;
+}
+
+// One edit of a sequence: `article` names an article by its tree path "P<n>".
+struct Edit {
+    enum Op { Add, RemovePath, RemoveSome, Regroup, Replace, InPlace, EraseFirst, Edited, Clear } op;
+    const char* group = "";
+    const char* key = "";
+    const char* code = "";
+    int article = 0;
+    int number = -1;
+};
+
+// Answers every query both ways, then compares the indexes themselves.
+void ExpectIndexesExact(CZodEVIBdr& bdr, const std::vector<std::string>& keys, const std::vector<std::string>& prefixes)
+{
+    for (const auto& [groupKey, group] : bdr.Groups()) {
+        SCOPED_TRACE(groupKey);
+        for (const std::string& key : keys) {
+            const CZodEVIFound found = bdr.FindInGroupByQuantityKey(key, group.get());
+            const CZodEVIFound scanned = ScannedByKey(*group, key);
+            EXPECT_EQ(found.index, scanned.index) << key;
+            EXPECT_EQ(found.article, scanned.article) << key;
+        }
+        for (const std::string& prefix : prefixes)
+            EXPECT_EQ(bdr.NewCode(prefix, group.get()), ScannedNewCode(prefix, *group)) << prefix;
+        std::vector<CZodEVIArticle*> pipes;
+        for (CZodEVIArticle* a : *group)
+            if (a->quantityKey.starts_with("\"T"))
+                pipes.push_back(a);
+        EXPECT_EQ(group->Family("pipes", [](std::string_view k) { return k.starts_with("\"T"); }), pipes);
+    }
+    EXPECT_EQ(bdr.NextFreeNumber(), ScannedNextFree(bdr));
+    EXPECT_EQ(bdr.CheckIndexes(), "");
+}
+
+CZodEVIArticle* ByPath(CZodEVIBdr& bdr, int n)
+{
+    return bdr.FindByTreePath("P" + std::to_string(n)).article;
+}
+
+void Apply(CZodEVIBdr& bdr, const Edit& e)
+{
+    switch (e.op) {
+    case Edit::Add: {
+        auto article = std::make_unique<CZodEVIArticle>();
+        article->groupKey = e.group;
+        article->quantityKey = e.key;
+        article->code = e.code;
+        article->treePath = "P" + std::to_string(e.article);
+        article->number = e.number < 0 ? bdr.TakeNextNumber() : e.number;
+        bdr.GroupOf(e.group, true)->push_back(bdr.AddArticle(std::move(article)));
+        break;
+    }
+    case Edit::RemovePath:
+        bdr.RemoveByTreePath("P" + std::to_string(e.article));
+        break;
+    case Edit::RemoveSome:
+        bdr.RemoveArticles({ByPath(bdr, e.article), ByPath(bdr, e.number)});
+        break;
+    case Edit::Regroup:
+    case Edit::Replace: {
+        CZodEVIArticle* stored = ByPath(bdr, e.article);
+        ASSERT_NE(stored, nullptr);
+        CZodEVIArticle fields = *stored;
+        if (e.op == Edit::Regroup)
+            fields.groupKey = e.group;
+        else {
+            fields.quantityKey = e.key;
+            fields.code = e.code;
+            if (e.number >= 0)
+                fields.number = e.number;
+        }
+        bdr.ReplaceArticle(*stored, fields);
+        break;
+    }
+    case Edit::InPlace: {
+        CZodEVIArticle* stored = ByPath(bdr, e.article);
+        ASSERT_NE(stored, nullptr);
+        stored->quantityKey = e.key;
+        stored->code = e.code;
+        if (e.number >= 0)
+            stored->number = e.number;
+        bdr.ArticleChanged();
+        break;
+    }
+    case Edit::EraseFirst: {
+        CZodEVIGroup* group = bdr.GroupOf(e.group, false);
+        ASSERT_NE(group, nullptr);
+        group->erase(group->begin());
+        break;
+    }
+    case Edit::Edited: {
+        CZodEVIArticle edited;
+        edited.groupKey = e.group;
+        edited.quantityKey = e.key;
+        edited.code = e.code;
+        edited.treePath = "P" + std::to_string(e.article);
+        edited.number = e.number;
+        bdr.AddEditedArticle(edited);
+        break;
+    }
+    case Edit::Clear:
+        bdr.Clear();
+        break;
+    }
+}
+
+// Every edit that can reach a group keeps its indexes equal to a scan: each sequence
+// first builds them (by querying), then edits, and the queries are compared after each
+// step. The keys and codes differ by case, accents and their written number form.
+TEST(CZodEVIBdr, IndexesFollowEveryEdit)
+{
+    using E = Edit;
+    struct Case {
+        const char* name;
+        std::vector<Edit> edits;
+    };
+    const Case cases[] = {
+        {"appends keep the first of equal keys",
+         {{E::Add, "g", "\"Té\"", "EP-001", 1}, {E::Add, "g", "\"TÉ\"", "ep-002", 2}, {E::Add, "g", "\"tÉ\"", "EP-003", 3}}},
+        {"removing the first of equal keys exposes the next",
+         {{E::Add, "g", "\"T\"", "EP-001", 1}, {E::Add, "g", "\"t\"", "EP-002", 2}, {E::RemovePath, "", "", "", 1}}},
+        {"removal shifts the positions after it",
+         {{E::Add, "g", "\"A\"", "EP-001", 1}, {E::Add, "g", "\"B\"", "EP-002", 2}, {E::Add, "g", "\"T\"", "EP-003", 3},
+          {E::RemoveSome, "", "", "", 1, 2}, {E::Add, "g", "\"A\"", "", 4}}},
+        {"a freed code number is found again",
+         {{E::Add, "g", "\"A\"", "EP-001", 1}, {E::Add, "g", "\"B\"", "EP-002", 2}, {E::Add, "g", "\"C\"", "EP-003", 3},
+          {E::RemovePath, "", "", "", 2}, {E::Add, "g", "\"D\"", "EP-004", 4}}},
+        {"only %03d forms take a number",
+         {{E::Add, "g", "\"A\"", "EP-0001", 1}, {E::Add, "g", "\"B\"", "EP-01", 2}, {E::Add, "g", "\"C\"", "EP-000", 3},
+          {E::Add, "g", "\"D\"", "EP-1000", 4}, {E::Add, "g", "\"E\"", "EP-+01", 5}, {E::Add, "g", "\"F\"", "ep-001", 6},
+          {E::Add, "g", "\"G\"", "X-EP-002", 7}, {E::Add, "g", "\"H\"", "EP-99999999999", 8}}},
+        {"regrouping moves the article between indexed groups",
+         {{E::Add, "g", "\"T\"", "EP-001", 1}, {E::Add, "h", "\"T\"", "EP-001", 2}, {E::Regroup, "h", "", "", 1},
+          {E::Regroup, "new", "", "", 2}}},
+        {"a replaced key and code leave the index",
+         {{E::Add, "g", "\"T\"", "EP-001", 1}, {E::Add, "g", "\"A\"", "EP-002", 2},
+          {E::Replace, "", "\"A\"", "EP-003", 1, 50}, {E::Replace, "", "\"Z\"", "", 2}}},
+        {"a change in place announced to the store",
+         {{E::Add, "g", "\"T\"", "EP-001", 1}, {E::Add, "g", "\"A\"", "EP-002", 2},
+          {E::InPlace, "", "\"B\"", "EP-001", 2, 90}, {E::Add, "g", "\"B\"", "", 3}}},
+        {"erasing through the group",
+         {{E::Add, "g", "\"T\"", "EP-001", 1}, {E::Add, "g", "\"t\"", "EP-002", 2}, {E::EraseFirst, "g"}}},
+        {"an edited article joins its group",
+         {{E::Add, "g", "\"T\"", "EP-001", 1}, {E::Edited, "g", "\"t\"", "ep-002", 2, 7}}},
+        {"numbers above the counter",
+         {{E::Add, "g", "\"A\"", "", 1, 5}, {E::Add, "g", "\"B\"", "", 2}, {E::Add, "g", "\"C\"", "", 3},
+          {E::RemovePath, "", "", "", 1}, {E::Add, "g", "\"D\"", "", 4}}},
+        {"clear then refill",
+         {{E::Add, "g", "\"T\"", "EP-001", 1}, {E::Clear}, {E::Add, "g", "\"a\"", "EP-002", 2}}},
+    };
+    const std::vector<std::string> keys = {"\"T\"", "\"té\"", "\"A\"", "\"b\"", "\"d\"", "\"Z\"", "\"\""};
+    const std::vector<std::string> prefixes = {"EP", "ep", "X-EP", "", "EP-", std::string("EP\0X", 4)};
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.name);
+        CZodEVIBdr bdr;
+        for (std::size_t i = 0; i < c.edits.size(); ++i) {
+            SCOPED_TRACE("after edit " + std::to_string(i + 1));
+            Apply(bdr, c.edits[i]);
+            ExpectIndexesExact(bdr, keys, prefixes);
+        }
+    }
+}
+
+// The same comparison over a long seeded mix of edits, with queries only now and then so
+// that indexes are also met half built.
+TEST(CZodEVIBdr, IndexesFollowARandomMixOfEdits)
+{
+    const char* groups[] = {"g", "G", "h"};
+    const char* keys[] = {"\"T\"", "\"t\"", "\"Té\"", "\"TÉ\"", "\"A\"", "\"\""};
+    const char* codes[] = {"EP-001", "ep-002", "EP-002", "Ép-001", "EP-1000", "EP-01", "X-EP-003", "", "ÉP-003"};
+    std::mt19937 random(14);
+    const auto pick = [&](const auto& pool) { return pool[random() % std::size(pool)]; };
+    CZodEVIBdr bdr;
+    int made = 0;
+    for (int step = 0; step < 800; ++step) {
+        SCOPED_TRACE("step " + std::to_string(step));
+        const int someone = made == 0 ? 0 : static_cast<int>(random() % made) + 1;
+        const bool exists = ByPath(bdr, someone) != nullptr;
+        const unsigned roll = random() % 20;
+        Edit e{Edit::Add, pick(groups), pick(keys), pick(codes), ++made};
+        if (roll < 3 && exists)
+            e = {Edit::RemovePath, "", "", "", someone};
+        else if (roll < 5)
+            e = {Edit::RemoveSome, "", "", "", someone, static_cast<int>(random() % made) + 1};
+        else if (roll < 7 && exists)
+            e = {Edit::Regroup, pick(groups), "", "", someone};
+        else if (roll < 9 && exists)
+            e = {Edit::Replace, "", pick(keys), pick(codes), someone, static_cast<int>(random() % 900)};
+        else if (roll < 10 && exists)
+            e = {Edit::InPlace, "", pick(keys), pick(codes), someone};
+        else if (roll < 11 && bdr.GroupOf(e.group, false) != nullptr && !bdr.GroupOf(e.group, false)->empty())
+            e = {Edit::EraseFirst, e.group};
+        else if (roll < 12)
+            e.op = Edit::Edited;
+        Apply(bdr, e);
+        if (random() % 3 == 0)
+            ExpectIndexesExact(bdr, {std::begin(keys), std::end(keys)}, {"EP", "ép", "X-EP", ""});
+        if (::testing::Test::HasFailure())
+            break;
+    }
 }
 
 TEST(PurgeFlag, OffUntilArmed)

@@ -142,6 +142,14 @@ bool HasPlaceholder(const std::vector<Piece>& pieces)
     return false;
 }
 
+// The articles of the group whose key fits the pattern, in group order; the group keeps
+// the list, so a large network is not scanned again for each article made or purged.
+const std::vector<CZodEVIArticle*>& FamilyMembers(const CZodEVIGroup& group, const std::string& codePattern,
+                                                  const std::vector<Piece>& pieces)
+{
+    return group.Family(codePattern, [pieces](std::string_view key) { return Fits(pieces, key); });
+}
+
 // What one instance fills: the code pattern, and the designation and description.
 struct Fill {
     std::vector<PatternArg> key;
@@ -185,9 +193,7 @@ std::optional<std::string> FamilyCategory(const std::string& codePattern, const 
     const auto pieces = SplitPattern(codePattern);
     if (!pieces || !HasPlaceholder(*pieces))
         return std::nullopt;
-    for (const CZodEVIArticle* article : group) {
-        if (!Fits(*pieces, article->quantityKey))
-            continue;
+    for (const CZodEVIArticle* article : FamilyMembers(group, codePattern, *pieces)) {
         auto category = CategoryOfSibling(*article);
         if (category && !category->empty())
             return category;
@@ -281,11 +287,9 @@ bool Purge(CZodEVIBdr& bdr, const CZodEVIArtTemplate& tmpl, CZodEVIGroup& group,
         kept.insert(FoldCase(MakeQuantityKey(FormatPattern(tmpl.codePattern, entry))));
 
     std::vector<const CZodEVIArticle*> victims;
-    for (const CZodEVIArticle* article : group) {
+    for (const CZodEVIArticle* article : FamilyMembers(group, tmpl.codePattern, *pieces)) {
         const std::string_view key = article->quantityKey;
         if (sampleLength && key.size() != *sampleLength)
-            continue;
-        if (!Fits(*pieces, key))
             continue;
         if (kept.count(FoldCase(key)) == 0)
             victims.push_back(article);

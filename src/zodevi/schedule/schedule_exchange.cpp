@@ -60,19 +60,8 @@ struct ReturnedArticles {
 // so that every article stays in the group of its own key.
 void ApplyModification(CZodEVIBdr& bdr, const CZodEVIArticle& returned)
 {
-    CZodEVIArticle* stored = bdr.FindByTreePath(returned.treePath).article;
-    if (stored == nullptr)
-        return;
-    const std::string oldKey = stored->groupKey;
-    *stored = returned;
-    if (oldKey == stored->groupKey)
-        return;
-    if (CZodEVIGroup* old = bdr.GroupOf(oldKey, false)) {
-        const auto it = std::find(old->begin(), old->end(), stored);
-        if (it != old->end())
-            old->erase(it);
-    }
-    bdr.GroupOf(stored->groupKey, true)->push_back(stored);
+    if (CZodEVIArticle* stored = bdr.FindByTreePath(returned.treePath).article)
+        bdr.ReplaceArticle(*stored, returned);
 }
 
 // Applies the editor's changes; true when an added article took a neighbour's group key.
@@ -168,12 +157,19 @@ bool Read(CZodEVIBdr& bdr)
     ReturnedArticles delivered;
     if (CallMetre<VtMetre_RemplitTableauFn>("VtMetre_RemplitTableau", std::string(bdr.path), &delivered.list, 1) != 0)
         return false;
+    CZodEVIGroup* group = nullptr;
+    const std::string* groupKey = nullptr;
     for (CZodEVIArticle*& raw : delivered.list) {
         if (raw == nullptr)
             continue;
         CZodEVIArticle* article = bdr.AddArticle(std::unique_ptr<CZodEVIArticle>(raw));
         raw = nullptr;
-        bdr.GroupOf(article->groupKey, true)->push_back(article);
+        // Files keep a group's articles together: the previous article's group is usually
+        // the one.
+        if (groupKey == nullptr || *groupKey != article->groupKey)
+            group = bdr.GroupOf(article->groupKey, true);
+        groupKey = &article->groupKey;
+        group->push_back(article);
     }
     AddProjectWideArticles(bdr);
     return true;

@@ -6,6 +6,7 @@
 #include "text/text.hpp"
 
 #include <algorithm>
+#include <climits>
 #include <filesystem>
 #include <unordered_set>
 
@@ -76,15 +77,19 @@ void CZodEVIBdr::Clear()
     groups.Clear();
     articles.clear();
     networkIndexes.Clear();
+    ForgetHighestNumber();
 }
 
 int CZodEVIBdr::NextFreeNumber() const
 {
-    // Usually every number is below the counter: one scan without allocation tells.
-    bool anyAtOrAbove = false;
-    for (const auto& article : articles)
-        anyAtOrAbove = anyAtOrAbove || article->number >= nextNumber;
-    if (!anyAtOrAbove)
+    if (!highestNumberKnown) {
+        highestNumber = INT_MIN;
+        for (const auto& article : articles)
+            highestNumber = std::max(highestNumber, article->number);
+        highestNumberKnown = true;
+    }
+    // Usually every number is below the counter.
+    if (highestNumber < nextNumber)
         return nextNumber;
     std::unordered_set<int> taken;
     taken.reserve(articles.size());
@@ -105,25 +110,16 @@ int CZodEVIBdr::TakeNextNumber()
 
 std::string CZodEVIBdr::NewCode(const std::string& prefix, const CZodEVIGroup* group) const
 {
-    std::unordered_set<std::string> taken;
-    if (group != nullptr)
-        for (const CZodEVIArticle* article : *group)
-            taken.insert(FoldCase(article->code));
-    for (int n = 1;; ++n) {
-        std::string code = FormatString("%s-%03d", prefix.c_str(), n);
-        if (taken.count(FoldCase(code)) == 0)
-            return code;
-    }
+    // The code is written through c_str(), so a prefix ends at its first NUL.
+    const int n = group == nullptr ? 1 : group->FreeCodeNumber(prefix.c_str());
+    return FormatString("%s-%03d", prefix.c_str(), n);
 }
 
 CZodEVIFound CZodEVIBdr::FindInGroupByQuantityKey(const std::string& quantityKey, const CZodEVIGroup* group) const
 {
     if (group == nullptr)
         return {};
-    for (std::size_t i = 0; i < group->size(); ++i)
-        if (EqualsNoCase((*group)[i]->quantityKey, quantityKey))
-            return {static_cast<long>(i), (*group)[i]};
-    return {};
+    return group->FindByQuantityKey(quantityKey);
 }
 
 CZodEVIFound CZodEVIBdr::FindByTreePath(const std::string& treePath) const
@@ -227,6 +223,8 @@ CZodEVIArticle* CZodEVIBdr::AddArticle(std::unique_ptr<CZodEVIArticle> article)
 {
     if (!article)
         return nullptr;
+    if (highestNumberKnown)
+        highestNumber = std::max(highestNumber, article->number);
     articles.push_back(std::move(article));
     return articles.back().get();
 }
@@ -243,12 +241,12 @@ bool CZodEVIBdr::RemoveByTreePath(const std::string& treePath)
     const CZodEVIFound found = FindByTreePath(treePath);
     if (!found)
         return false;
-    if (CZodEVIGroup* group = groups.Find(found.article->groupKey)) {
-        const auto at = std::find(group->begin(), group->end(), found.article);
-        if (at != group->end())
-            group->erase(at);
-    }
+    // Every group forgets it, not only that of its key, so that none keeps a pointer to
+    // a destroyed article.
+    for (const auto& entry : groups)
+        entry.second->RemoveIf([&](const CZodEVIArticle* a) { return a == found.article; });
     articles.erase(articles.begin() + found.index);
+    ForgetHighestNumber();
     return true;
 }
 
@@ -258,7 +256,8 @@ std::size_t CZodEVIBdr::RemoveArticles(const std::vector<const CZodEVIArticle*>&
     if (doomed.empty())
         return 0;
     for (const auto& entry : groups)
-        std::erase_if(*entry.second, [&](const CZodEVIArticle* a) { return doomed.count(a) != 0; });
+        entry.second->RemoveIf([&](const CZodEVIArticle* a) { return doomed.count(a) != 0; });
+    ForgetHighestNumber();
     return std::erase_if(articles, [&](const std::unique_ptr<CZodEVIArticle>& a) { return doomed.count(a.get()) != 0; });
 }
 
@@ -317,6 +316,48 @@ bool CZodEVIBdr::FindModel(const std::string& category, CZodEVIArticle& model, s
                 return true;
     }
     return false;
+}
+
+void CZodEVIBdr::ReplaceArticle(CZodEVIArticle& stored, const CZodEVIArticle& fields)
+{
+    const std::string oldKey = stored.groupKey;
+    stored = fields;
+    ArticleChanged();
+    if (oldKey == stored.groupKey)
+        return;
+    if (CZodEVIGroup* old = groups.Find(oldKey)) {
+        const auto at = std::find(old->begin(), old->end(), &stored);
+        if (at != old->end())
+            old->erase(at);
+    }
+    groups.Get(stored.groupKey).push_back(&stored);
+}
+
+void CZodEVIBdr::ArticleChanged()
+{
+    // Which groups list the article is not recorded; dropping every index costs one
+    // rebuild per group later used, and edits by hand are rare.
+    for (const auto& entry : groups)
+        entry.second->Invalidate();
+    ForgetHighestNumber();
+}
+
+std::string CZodEVIBdr::CheckIndexes() const
+{
+    std::string problems;
+    for (const auto& [key, group] : groups) {
+        const std::string groupProblems = group->CheckIndexes();
+        if (!groupProblems.empty())
+            problems += "group " + key + ": " + groupProblems;
+    }
+    if (highestNumberKnown) {
+        int highest = INT_MIN;
+        for (const auto& article : articles)
+            highest = std::max(highest, article->number);
+        if (highest != highestNumber)
+            problems += FormatString("highest number %d, %d kept; ", highest, highestNumber);
+    }
+    return problems;
 }
 
 void CZodEVIBdr::SetNetworkIndex(const std::string& groupKey, int networkIndex)

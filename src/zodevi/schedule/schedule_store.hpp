@@ -4,6 +4,7 @@
 
 #include "schedule/art_template.hpp"
 #include "schedule/article.hpp"
+#include "schedule/article_group.hpp"
 #include "schedule/insertion_map.hpp"
 
 #include <memory>
@@ -13,8 +14,6 @@
 #include <utility>
 #include <vector>
 
-// A group lists articles of the schedule without owning them.
-using CZodEVIGroup = std::vector<CZodEVIArticle*>;
 using CZodEVIArticleList = std::vector<CZodEVIArticle*>;
 
 // What the schedule needs from outside to find its default file: the main services
@@ -42,14 +41,6 @@ CZodEVIBdrEnvironment* GetBdrEnvironment();
 // The module-wide purge flag: false at load, set by the purge command, read by updates.
 bool GetPurgeFlag();
 void SetPurgeFlag(bool purge);
-
-// Result of a search by quantity key or tree path: the position in the searched list
-// and the article, or -1 and null.
-struct CZodEVIFound {
-    long index = -1;
-    CZodEVIArticle* article = nullptr;
-    explicit operator bool() const { return article != nullptr; }
-};
 
 class CZodEVIBdr {
 public:
@@ -83,6 +74,8 @@ public:
     CZodEVIArticle* AddArticle(std::unique_ptr<CZodEVIArticle> article);
     // The group of a key; with create, an empty one is made when missing.
     CZodEVIGroup* GroupOf(const std::string& groupKey, bool create);
+    // Removes the first article of that tree path from the schedule and from every group
+    // that lists it.
     bool RemoveByTreePath(const std::string& treePath);
     // Removes these articles from every group that lists them and from the schedule,
     // and destroys them; pointers that are not in the schedule are ignored. Answers how
@@ -96,6 +89,16 @@ public:
     // article; `exclude` (the article being placed) is never its own model.
     bool FindModel(const std::string& category, CZodEVIArticle& model, std::set<std::string>& visited,
                    const CZodEVIArticle* exclude = nullptr) const;
+    // Gives an article of the schedule the fields of `fields`; when its group key changes
+    // it leaves the old key's group for the new key's. This is how an edited article is
+    // put back: a key, code or number changed in place would escape the indexes.
+    void ReplaceArticle(CZodEVIArticle& stored, const CZodEVIArticle& fields);
+    // For a caller that changed an article's quantity key, code or number in place: the
+    // indexes are built again when next used.
+    void ArticleChanged();
+    // Compares every index with a scan of the schedule; empty when they agree, else what
+    // differs. For tests.
+    std::string CheckIndexes() const;
 
     // The network index a network update was given for a network group.
     void SetNetworkIndex(const std::string& groupKey, int networkIndex);
@@ -112,10 +115,15 @@ public:
     int nextNumber = 1;
 
 private:
+    void ForgetHighestNumber() { highestNumberKnown = false; }
+
     std::vector<std::unique_ptr<CZodEVIArticle>> articles;
     InsertionMap<CZodEVIGroup> groups;
     InsertionMap<int> networkIndexes;
     CZodEVIArtTemplateArray catalogue;
+    // The highest article number, so that numbering need not scan the schedule.
+    mutable bool highestNumberKnown = false;
+    mutable int highestNumber = 0;
 };
 
 // Default schedule file name and where its path is stored in the parameter file.

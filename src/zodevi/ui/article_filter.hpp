@@ -88,6 +88,7 @@ private:
 class CZodEVIArticleKeyIndex {
 public:
     void Build(const CZodEVIArticleList& articles);
+    void Build(const CZodEVIGroup& group) { Build(CZodEVIArticleList(group.begin(), group.end())); }
     const CZodEVIArticleList* Find(const std::string& quantityKey) const;
 
 private:

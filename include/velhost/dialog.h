@@ -437,6 +437,14 @@ class VelUserInterface;
 // terminal it is said and the next line is read. Answers the dialog's result.
 int velRunDialogLines(CVelDialog& dialog, VelUserInterface& ui);
 
+// The screen view: the dialog drawn on the whole terminal (ncurses, wide characters, a
+// UTF-8 character type while it shows), its controls placed by the template and the
+// resize rules, keys and mouse turned into the calls above; afterwards the terminal is
+// as it was. Where the terminal cannot show it (input or output not a terminal, TERM
+// unset, unknown or unable to place the cursor, too small), it says so through `ui` and
+// closes the dialog as "Quitter". Answers the dialog's result.
+int velRunDialogScreen(CVelDialog& dialog, VelUserInterface& ui);
+
 // The trees as the line view's "afficher" prints them: for each tree its caption on a
 // line, then one item a line, four spaces of indent per level, "[ ]", "[x]" or "[~]",
 // a space, the text and, for an item with column texts, " | " and each column.

@@ -11,7 +11,6 @@
 #include <cerrno>
 #include <cmath>
 #include <cstdio>
-#include <cstdlib>
 #include <cwchar>
 #include <iostream>
 #include <string>
@@ -253,10 +252,8 @@ bool ScreenView::Place(int columns, int lines, std::vector<Placed>& placed) {
 }
 
 std::string ScreenView::Open() {
-  if (!isatty(STDIN_FILENO) || !isatty(STDOUT_FILENO)) return "l'entrée ou la sortie n'est pas un terminal";
-  const char* term = std::getenv("TERM");
-  if (term == nullptr || *term == '\0') return "la variable TERM n'est pas définie";
-  if (std::string(term) == "dumb") return "le terminal « dumb » ne peut pas afficher un dialogue plein écran";
+  const std::string problem = velScreenTerminalProblem();
+  if (!problem.empty()) return problem;
   // Said before the screen changes, when the size is known.
   winsize size{};
   if (ioctl(STDOUT_FILENO, TIOCGWINSZ, &size) == 0 && size.ws_col > 0 && size.ws_row > 0) {
@@ -266,12 +263,7 @@ std::string ScreenView::Open() {
   std::cout.flush();
   std::fflush(stdout);
   screen_ = newterm(nullptr, stdout, stdin);
-  if (screen_ == nullptr) return FormatString("type de terminal « %s » inconnu", term);
-  const char* address = tigetstr("cup");
-  if (address == nullptr || address == reinterpret_cast<const char*>(-1)) {
-    Shut();
-    return FormatString("le terminal « %s » ne sait pas placer le curseur", term);
-  }
+  if (screen_ == nullptr) return "le terminal ne peut pas être initialisé";
   std::vector<Placed> trial;
   if (!Place(COLS, LINES, trial)) {
     const int columns = COLS, lines = LINES;

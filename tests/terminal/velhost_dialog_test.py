@@ -290,6 +290,7 @@ CASES = [
      "le terminal « dumb » ne peut pas afficher un dialogue plein écran"),
     ("small", case_unable, ("fr_FR.UTF-8",), (70, 20), "tmux-256color",
      "le terminal fait 70 colonnes sur 20 lignes, il en faut au moins 80 sur 12"),
+    ("unknown", case_unable, ("-",), (100, 30), "vt-inconnu", "type de terminal « vt-inconnu » inconnu"),
 ]
 
 

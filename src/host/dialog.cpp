@@ -591,9 +591,10 @@ void CVelDialog::WritePosition() {
   for (const VelDialogControl& control : template_.controls) {
     if (control.kind != VelControlKind::kRadio || GroupStart(template_, control.id) != control.id) continue;
     const std::vector<int> group = RadioGroup(template_, control.id);
+    // A preference that cannot be kept is not worth a message at the end of a command.
     for (std::size_t i = 0; i < group.size(); ++i)
-      // A preference that cannot be kept is not worth a message at the end of a command.
-      if (IsDlgButtonChecked(group[i])) velRegSetValue(kSettingsRoot, key, RadioValueName(control.id), std::to_string(i));
+      if (IsDlgButtonChecked(group[i]))
+        velRegSetValue(kSettingsRoot, key, RadioValueName(control.id), std::to_string(i));
   }
 }
 

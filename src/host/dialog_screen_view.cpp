@@ -410,8 +410,8 @@ void ScreenView::DrawTree(const Placed& p) {
   for (std::size_t i = 0; i < columns.size(); ++i) {
     sum += std::max(0, columns[i].width);
     const bool last = i + 1 == columns.size() || total <= 0;
-    bounds.push_back(last ? inRight
-                          : inLeft + static_cast<int>(std::lround(static_cast<double>(inRight - inLeft) * sum / total)));
+    const double share = total > 0 ? static_cast<double>(sum) / static_cast<double>(total) : 1.0;
+    bounds.push_back(last ? inRight : inLeft + static_cast<int>(std::lround((inRight - inLeft) * share)));
     if (last) break;
   }
   // Headings on the top border, each over its column.

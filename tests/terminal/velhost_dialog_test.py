@@ -132,7 +132,8 @@ def check_layout(d, width, height):
     _, top = d.find("┌ Projet ")
     heading = rows[top]
     left, right = heading.find("┌ Article "), heading.rfind("┐")
-    expect(heading.index("┌ Projet ") < left and right == width - 2, "both trees side by side, the articles on the right")
+    expect(heading.index("┌ Projet ") < left and right == width - 2,
+           "both trees side by side, the articles on the right")
     expect(heading[:right].rstrip("─ ").endswith("Quantité"), "the heading Quantité on the right end")
     expect(" Prix unit" in heading, "the heading Prix unitaire HT")
     # Prices and quantities right-aligned in their quarters of the article tree.
@@ -174,8 +175,8 @@ def case_layout_resize(d):
         raise CaseFailure(f"80 more columns gave the trees {grown_projects} and {grown_articles}, not 20 and 60")
     d.find("└ Regards Boîte de branchement")  # cut in its row, whole on the border
     d.t.resize(60, 20)
-    d.until(lambda s: "le terminal fait 60 colonnes sur 20 lignes, il en faut au moins 80 sur 12" in " ".join(s.split()),
-            "the message of a terminal too small")
+    too_small = "le terminal fait 60 colonnes sur 20 lignes, il en faut au moins 80 sur 12"
+    d.until(lambda s: too_small in " ".join(s.split()), "the message of a terminal too small")
     d.t.resize(100, 30)
     d.until(lambda s: "[ Quitter ]" in s and len(s.split("\n")) == 30, "the dialog at 100×30")
     check_layout(d, 100, 30)

@@ -250,7 +250,8 @@ TEST_F(QuantitiesDialog, ARebuildKeepsWhereThePersonStood)
     const auto click = [&](const char* project) {
         SECTreeCtrl& projects = dialog.m_treeProjects;
         for (HTREEITEM group = projects.GetRootItem(); group != nullptr; group = projects.GetNextSiblingItem(group))
-            for (HTREEITEM item = projects.GetChildItem(group); item != nullptr; item = projects.GetNextSiblingItem(item))
+            for (HTREEITEM item = projects.GetChildItem(group); item != nullptr;
+                 item = projects.GetNextSiblingItem(item))
                 if (projects.GetItemText(item) == project) {
                     CRect box;
                     ASSERT_TRUE(projects.GetItemRect(item, box, VelTreePart::kImage));

@@ -272,7 +272,8 @@ void DlgMetExpArt::RefillArticleTree()
 {
     std::unordered_map<std::string, std::string> remembered;
     std::unordered_set<std::string> closed;
-    for (HTREEITEM root = m_treeArticles.GetRootItem(); root != nullptr; root = m_treeArticles.GetNextSiblingItem(root)) {
+    for (HTREEITEM root = m_treeArticles.GetRootItem(); root != nullptr;
+         root = m_treeArticles.GetNextSiblingItem(root)) {
         SaveCheckedPaths(root, remembered);
         SaveClosedPaths(root, {}, closed);
     }
@@ -302,7 +303,8 @@ void DlgMetExpArt::RefillArticleTree()
 
     for (HTREEITEM root = m_treeArticles.GetRootItem(); root != nullptr; root = m_treeArticles.GetNextSiblingItem(root))
         RestoreCheckedPaths(root, remembered);
-    for (HTREEITEM root = m_treeArticles.GetRootItem(); root != nullptr; root = m_treeArticles.GetNextSiblingItem(root)) {
+    for (HTREEITEM root = m_treeArticles.GetRootItem(); root != nullptr;
+         root = m_treeArticles.GetNextSiblingItem(root)) {
         UpdateCategoryStates(root);
         if (!closed.empty())
             RestoreClosedPaths(root, {}, closed);

@@ -24,6 +24,10 @@ constexpr unsigned VK_TAB = 0x09;
 constexpr unsigned VK_RETURN = 0x0D;
 constexpr unsigned VK_ESCAPE = 0x1B;
 constexpr unsigned VK_SPACE = 0x20;
+constexpr unsigned VK_LEFT = 0x25;
+constexpr unsigned VK_UP = 0x26;
+constexpr unsigned VK_RIGHT = 0x27;
+constexpr unsigned VK_DOWN = 0x28;
 
 // Notification codes: a click on a tree (NM_CLICK), a button pressed (BN_CLICKED).
 constexpr int NM_CLICK = -2;
@@ -116,8 +120,9 @@ class CDataExchange;
 // 0 unchecked, 1 checked, 2 partly), a 32-bit data value and an expand state.
 // Geometry, for hit tests and views: the rows are the items whose ancestors are all
 // expanded, in tree order, from the first visible row on; row r lies at y = r * rowHeight;
-// an item of level L (0 at the root) has its image at x = L * indent, imageWidth wide,
-// then one cell, then its text (one cell per character).
+// an item of level L (0 at the root) has its image at x = origin + L * indent, imageWidth
+// wide, then one cell, then its text (one cell per character); the indent cells just left
+// of the image of an item with children are its open/close button.
 class SECTreeCtrl {
  public:
   SECTreeCtrl();
@@ -188,6 +193,7 @@ class SECTreeCtrl {
     int rowHeight = 1;
     int indent = 4;
     int imageWidth = 3;
+    int origin = 0;  // room before a root item's image (for its button)
   };
   void SetMetrics(const Metrics& metrics) { metrics_ = metrics; }
   const Metrics& GetMetrics() const { return metrics_; }
@@ -289,8 +295,9 @@ std::string velProfileRegistryKey(const std::string& profile);
 //  3. Turns acts into calls, then shows the dialog again:
 //     - a mouse press on a tree at a client point: Click(treeId, point). The dialog
 //       sees WM_LBUTTONDOWN in PreTranslateMessage, the tree selects the item under the
-//       point, then NM_CLICK reaches the mapped handler, which decides by hit test
-//       whether the point is on the check image (toggle) or the text (nothing more);
+//       point (or, on an item's button, opens or closes it), then NM_CLICK reaches the
+//       mapped handler, which decides by hit test whether the point is on the check
+//       image (toggle) or the text (nothing more);
 //     - Space on a tree's selected item: Click at the centre of its image rectangle
 //       (GetItemRect(item, r, VelTreePart::kImage)), exactly as the mouse would;
 //     - arrows, pages, opening and closing: the tree's own SelectItem, Expand,
@@ -301,7 +308,8 @@ std::string velProfileRegistryKey(const std::string& profile);
 //     - a key: KeyDown(vk, shift). It goes through PreTranslateMessage first (which may
 //       change it: the quantities dialog turns Enter into Tab); then Tab / Shift-Tab
 //       move the focus among tab stops, Escape cancels, Enter or Space on a focused
-//       button presses it, Space on a focused radio button clicks it;
+//       button presses it, Space on a focused radio button clicks it, the arrows on a
+//       focused radio button click the previous or next one of its group;
 //     - the window's close box, end of input, ^C: Close() (WM_CLOSE, as "Quitter").
 //  4. Stops when IsEnded(); GetResult() is IDOK or IDCANCEL.
 class CVelDialog {
@@ -349,9 +357,11 @@ class CVelDialog {
   void CheckRadioButton(int firstId, int lastId, int checkedId);
   void EnableToolTips(bool enable) { toolTips_ = enable; }
 
-  // Placement settings. A terminal dialog has no window placement to keep, so
-  // ReadPosition restores nothing and answers false; the root key (ProfileKey) is where
-  // a view may keep what a user wants found again.
+  // Placement settings. A terminal dialog has no window placement to keep; what a
+  // person wants found again is the choice made in each radio group. With persistence
+  // on, a dialog ended by IDOK keeps that choice under the root key (ProfileKey), and
+  // ReadPosition clicks the button kept there, as the person would (false when none is
+  // kept). A scripted run neither reads nor writes it: a script says what it wants.
   void SetRootKey(VelRootKeyCallback callback, const std::string& profile);
   std::string ProfileKey() const;
   void SetDialogName(const std::string& name) { dialogName_ = name; }
@@ -379,6 +389,7 @@ class CVelDialog {
   friend class CVelResizeInfoArray;
   void Notify(int id, int code);
   void Command(int id, int code);
+  void WritePosition();
   void RunPosted();
   void MoveFocus(bool backwards);
   std::vector<int> FocusOrder() const;
@@ -425,6 +436,14 @@ class VelUserInterface;
 // (closed, as "Quitter") and fails the running command (velFailCommand); at the
 // terminal it is said and the next line is read. Answers the dialog's result.
 int velRunDialogLines(CVelDialog& dialog, VelUserInterface& ui);
+
+// The screen view: the dialog drawn on the whole terminal (ncurses, wide characters, a
+// UTF-8 character type while it shows), its controls placed by the template and the
+// resize rules, keys and mouse turned into the calls above; afterwards the terminal is
+// as it was. Where the terminal cannot show it (input or output not a terminal, TERM
+// unset, unknown or unable to place the cursor, too small), it says so through `ui` and
+// closes the dialog as "Quitter". Answers the dialog's result.
+int velRunDialogScreen(CVelDialog& dialog, VelUserInterface& ui);
 
 // The trees as the line view's "afficher" prints them: for each tree its caption on a
 // line, then one item a line, four spaces of indent per level, "[ ]", "[x]" or "[~]",

@@ -105,6 +105,9 @@ class VelTerminalUI : public VelUserInterface {
   void print(const std::string& text) override;
   int messageBox(const VelMessageBox& box) override;
   bool isScripted() const override { return false; }
+  // The dialog on the whole screen (velRunDialogScreen); what is printed meanwhile is
+  // shown once the screen is left.
+  int runDialog(CVelDialog& dialog) override;
   // The line history of earlier sessions (line editing only); a missing file is no error.
   void loadHistory(const std::string& fileName);
   bool saveHistory(const std::string& fileName) const;
@@ -117,6 +120,7 @@ class VelTerminalUI : public VelUserInterface {
   std::istream& in_;
   std::ostream& out_;
   std::unique_ptr<LineEditor> editor_;
+  std::string held_;
 };
 
 // Makes the character type UTF-8 for its lifetime: the user's locale when it is UTF-8,

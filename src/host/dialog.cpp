@@ -3,8 +3,10 @@
 #include "velhost/dialog.h"
 
 #include <algorithm>
+#include <charconv>
 
 #include "text/text.hpp"
+#include "velhost/profile.h"
 #include "velhost/ui.h"
 
 struct VelTreeItem {
@@ -239,7 +241,7 @@ HTREEITEM SECTreeCtrl::HitTest(CPoint point, unsigned* flags) const {
   const std::size_t row = static_cast<std::size_t>(point.y / rowHeight);
   if (row >= rows.size()) return answer(nullptr, TVHT_NOWHERE);
   HTREEITEM item = rows[row];
-  const int imageX = GetItemLevel(item) * metrics_.indent;
+  const int imageX = metrics_.origin + GetItemLevel(item) * metrics_.indent;
   if (point.x < imageX) {
     const bool onButton = !item->children.empty() && point.x >= imageX - metrics_.indent;
     return answer(item, onButton ? TVHT_ONITEMBUTTON : TVHT_ONITEMINDENT);
@@ -256,7 +258,7 @@ bool SECTreeCtrl::GetItemRect(HTREEITEM item, CRect& rect, VelTreePart part) con
   if (item == nullptr || found == rows.end()) return false;
   const int rowHeight = std::max(1, metrics_.rowHeight);
   const int y = static_cast<int>(found - rows.begin()) * rowHeight;
-  const int imageX = GetItemLevel(item) * metrics_.indent;
+  const int imageX = metrics_.origin + GetItemLevel(item) * metrics_.indent;
   switch (part) {
     case VelTreePart::kRow:
       rect = {0, y, imageX + metrics_.imageWidth + 1 + static_cast<int>(CharCount(item->text)), rowHeight};
@@ -433,7 +435,14 @@ void CVelDialog::Click(int id, CPoint point) {
       case VelControlKind::kTree:
         focus_ = id;
         if (SECTreeCtrl* tree = GetTree(id)) {
-          if (HTREEITEM item = tree->HitTest(point, nullptr)) tree->SelectItem(item);
+          unsigned flags = 0;
+          if (HTREEITEM item = tree->HitTest(point, &flags)) {
+            // An item's button opens or closes it and leaves the selection where it is.
+            if (flags & TVHT_ONITEMBUTTON)
+              tree->Expand(item, TVE_TOGGLE);
+            else
+              tree->SelectItem(item);
+          }
         }
         Notify(id, NM_CLICK);
         break;
@@ -466,6 +475,20 @@ void CVelDialog::KeyDown(unsigned virtualKey, bool shift) {
       case VK_RETURN: Command(kind == VelControlKind::kButton ? focus_ : IDOK, BN_CLICKED); break;
       case VK_SPACE:
         if (kind == VelControlKind::kButton || kind == VelControlKind::kRadio) Click(focus_, {});
+        break;
+      case VK_LEFT:
+      case VK_UP:
+      case VK_RIGHT:
+      case VK_DOWN:
+        if (kind == VelControlKind::kRadio) {
+          // One tab stop for the group: the arrows choose within it.
+          const std::vector<int> group = RadioGroup(template_, GroupStart(template_, focus_));
+          const auto at = std::find(group.begin(), group.end(), focus_);
+          if (at == group.end()) break;
+          const std::ptrdiff_t n = static_cast<std::ptrdiff_t>(group.size());
+          const std::ptrdiff_t step = msg.wParam == VK_LEFT || msg.wParam == VK_UP ? -1 : 1;
+          Click(group[static_cast<std::size_t>(((at - group.begin() + step) % n + n) % n)], {});
+        }
         break;
       default: break;
     }
@@ -503,6 +526,8 @@ bool CVelDialog::UpdateData(bool saveAndValidate) {
 void CVelDialog::EndDialog(int result) {
   ended_ = true;
   result_ = result;
+  // What was chosen for a result that counts is what the person wants next time.
+  if (result == IDOK) WritePosition();
 }
 
 void CVelDialog::PostMessage(unsigned message) { posted_.push_back(message); }
@@ -529,7 +554,49 @@ std::string CVelDialog::ProfileKey() const {
   return dialogName_.empty() ? key : key + "\\" + dialogName_;
 }
 
-bool CVelDialog::ReadPosition() { return false; }
+namespace {
+
+constexpr const char* kSettingsRoot = "HKEY_CURRENT_USER";
+
+std::string RadioValueName(int firstId) { return "Radio" + std::to_string(firstId); }
+
+}  // namespace
+
+bool CVelDialog::ReadPosition() {
+  if (!persist_ || velUI().isScripted()) return false;
+  const std::string key = ProfileKey();
+  if (key.empty()) return false;
+  bool read = false;
+  const int focus = focus_;
+  for (const VelDialogControl& control : template_.controls) {
+    if (control.kind != VelControlKind::kRadio || GroupStart(template_, control.id) != control.id) continue;
+    const std::vector<int> group = RadioGroup(template_, control.id);
+    std::string text;
+    if (!velRegQueryValue(kSettingsRoot, key, RadioValueName(control.id), text, 16)) continue;
+    std::size_t index = 0;
+    const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), index);
+    if (error != std::errc() || end != text.data() + text.size() || index >= group.size()) continue;
+    read = true;
+    // A click, so that the dialog follows the choice as it follows the person's.
+    if (!IsDlgButtonChecked(group[index])) Click(group[index], {});
+  }
+  focus_ = focus;
+  return read;
+}
+
+void CVelDialog::WritePosition() {
+  if (!persist_ || velUI().isScripted()) return;
+  const std::string key = ProfileKey();
+  if (key.empty()) return;
+  for (const VelDialogControl& control : template_.controls) {
+    if (control.kind != VelControlKind::kRadio || GroupStart(template_, control.id) != control.id) continue;
+    const std::vector<int> group = RadioGroup(template_, control.id);
+    // A preference that cannot be kept is not worth a message at the end of a command.
+    for (std::size_t i = 0; i < group.size(); ++i)
+      if (IsDlgButtonChecked(group[i]))
+        velRegSetValue(kSettingsRoot, key, RadioValueName(control.id), std::to_string(i));
+  }
+}
 
 void CVelDialog::OnNotifyMessage(int id, int code, NotifyHandler handler) {
   handlers_.push_back({id, code, true, std::move(handler), nullptr});

@@ -28,3 +28,13 @@ std::string velNativePath(const std::string& name);
 // Replaces a file once its new content is completely on disk, keeping its mode; false
 // with errno set, the old file untouched, on failure.
 bool velReplaceFile(const std::string& fileName, const std::string& content);
+
+// Why the process's terminal cannot show a full-screen dialog (input or output not a
+// terminal, TERM unset, "dumb", unknown or unable to place the cursor); "" when it can.
+std::string velScreenTerminalProblem();
+
+// True while a dialog's screen view holds the terminal: output then waits for its end.
+bool velDialogScreenShowing();
+// Gives the terminal back to the command line (a question to ask) until the dialog's
+// screen view next draws.
+void velSuspendDialogScreen();

@@ -15,7 +15,9 @@
 #include <cstring>
 #include <iostream>
 
+#include "host_internal.h"
 #include "text/text.hpp"
+#include "velhost/dialog.h"
 
 std::vector<int> velMessageBoxButtons(unsigned style) {
   switch (style & 0xF) {
@@ -315,8 +317,19 @@ VelTerminalUI::VelTerminalUI(std::istream& in, std::ostream& out, bool lineEditi
 VelTerminalUI::~VelTerminalUI() = default;
 
 void VelTerminalUI::print(const std::string& text) {
-  out_ << text;
+  if (velDialogScreenShowing()) {
+    held_ += text;
+    return;
+  }
+  out_ << held_ << text;
+  held_.clear();
   out_.flush();
+}
+
+int VelTerminalUI::runDialog(CVelDialog& dialog) {
+  const int result = velRunDialogScreen(dialog, *this);
+  if (!held_.empty()) print({});
+  return result;
 }
 
 std::optional<VelInputLine> VelTerminalUI::readRawLine(const std::string& prompt) {
@@ -363,6 +376,8 @@ bool VelTerminalUI::saveHistory(const std::string& fileName) const {
 }
 
 int VelTerminalUI::messageBox(const VelMessageBox& box) {
+  // A question asked while a dialog holds the screen is asked on the command line.
+  velSuspendDialogScreen();
   print(velMessageBoxTranscript(box));
   const std::vector<int> buttons = velMessageBoxButtons(box.style);
   const int def = velMessageBoxDefault(box.style);

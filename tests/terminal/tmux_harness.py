@@ -57,8 +57,12 @@ wait_for(text, timeout=None, where="transcript")
                          has no transcript); answers the screen.
 wait_for_prompt(prompt, timeout=None)
                          waits until the cursor stands at the end of prompt on a line below
-                         the one where the last send_line or send_keys happened; answers
-                         the screen.
+                         the one where the last send_line or send_keys happened (input sent
+                         to a full-screen program does not count: after it, the line of the
+                         input that started it); answers the screen.
+wait_screen(condition, what, timeout=None)
+                         waits until condition(screen) is true, the screen being the visible
+                         one as screen() answers it (for full-screen programs); answers it.
 wait_exit(timeout=None)  waits for the program's end and answers its exit status (a
                          negative signal number when a signal killed it).
 exit_status()            the status once ended, else None.
@@ -206,6 +210,9 @@ class TerminalSession:
             return state["y"] < len(rows) and rows[state["y"]].rstrip().endswith(wanted)
         return self._wait(shown, f"the prompt {prompt!r}", timeout)
 
+    def wait_screen(self, condition, what, timeout=None):
+        return self._wait(lambda state: condition(self.screen()), what, timeout)
+
     def wait_exit(self, timeout=None):
         deadline = time.monotonic() + (self.timeout if timeout is None else timeout)
         while True:
@@ -232,7 +239,7 @@ class TerminalSession:
 
     def _state(self):
         fields = self._tmux("display-message", "-p", "-t", "velterm",
-                            "#{pane_dead}|#{cursor_x}|#{cursor_y}|#{history_size}").split("|")
+                            "#{pane_dead}|#{cursor_x}|#{cursor_y}|#{history_size}|#{alternate_on}").split("|")
         status = None
         try:
             with open(self._status_file, encoding="ascii") as f:
@@ -242,12 +249,16 @@ class TerminalSession:
         # A launcher that died without a word still ends the wait.
         dead = status is not None or fields[0] == "1"
         x, y, history = (int(v) for v in fields[1:4])
-        return {"dead": dead, "status": status, "x": x, "y": y, "line": history + y}
+        return {"dead": dead, "status": status, "x": x, "y": y, "line": history + y, "alternate": fields[4] == "1"}
 
     def _remember_line(self):
         # Where the input goes: later waits look below it. Rows count for prompts (the
-        # cursor's row), joined lines for texts.
+        # cursor's row), joined lines for texts. Input to a full-screen program (on the
+        # alternate screen) leaves the marks at the last input on the normal screen,
+        # where what follows the program appears.
         state = self._state()
+        if state["alternate"]:
+            return
         self._mark = state["line"]
         joined = self._tmux("capture-pane", "-p", "-J", "-S", "-", "-E", str(state["y"]), "-t", "velterm")
         self._mark_joined = max(joined.count("\n"), 0)

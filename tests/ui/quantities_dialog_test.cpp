@@ -234,6 +234,48 @@ TEST_F(QuantitiesDialog, ClicksCountOnlyOnTheCheckBox)
     EXPECT_EQ(dialog.GetResult(), IDCANCEL);
 }
 
+TEST_F(QuantitiesDialog, ARebuildKeepsWhereThePersonStood)
+{
+    DlgMetExpArt dialog(nullptr, &bdr);
+    ScriptedSession session;
+    ASSERT_TRUE(dialog.StartModal());
+    SECTreeCtrl& articles = dialog.m_treeArticles;
+    articles.SetVisibleCount(3);
+    const auto path = [&](HTREEITEM item) {
+        std::string text;
+        for (; item != nullptr; item = articles.GetParentItem(item))
+            text = articles.GetItemText(item) + (text.empty() ? "" : "\\" + text);
+        return text;
+    };
+    const auto click = [&](const char* project) {
+        SECTreeCtrl& projects = dialog.m_treeProjects;
+        for (HTREEITEM group = projects.GetRootItem(); group != nullptr; group = projects.GetNextSiblingItem(group))
+            for (HTREEITEM item = projects.GetChildItem(group); item != nullptr;
+                 item = projects.GetNextSiblingItem(item))
+                if (projects.GetItemText(item) == project) {
+                    CRect box;
+                    ASSERT_TRUE(projects.GetItemRect(item, box, VelTreePart::kImage));
+                    dialog.Click(IDC_TREE_PROJECTS, {box.x, box.y});
+                }
+    };
+    // Voirie closed, "PVC 200" chosen at the bottom of three rows; R1 off rebuilds.
+    articles.Expand(articles.GetRootItem(), TVE_COLLAPSE);
+    HTREEITEM pvc = articles.GetChildItem(articles.GetChildItem(articles.GetNextSiblingItem(articles.GetRootItem())));
+    articles.SelectItem(pvc);
+    articles.EnsureVisible(pvc);
+    ASSERT_EQ(path(pvc), "EU\\Canalisation\\PVC 200");
+    click("R1");
+    HTREEITEM selected = articles.GetSelectedItem();
+    EXPECT_EQ(path(selected), "EU\\Canalisation\\PVC 200");
+    EXPECT_FALSE(articles.IsExpanded(articles.GetRootItem()));
+    EXPECT_EQ(articles.GetVisibleItems().back(), selected);
+
+    // Nothing is left chosen where the whole path has gone.
+    click("EU 1");
+    click("EU 2");
+    EXPECT_EQ(articles.GetSelectedItem(), nullptr);
+}
+
 TEST_F(QuantitiesDialog, EmptyScheduleClosesAtOnce)
 {
     CZodEVIBdr empty;

@@ -271,8 +271,16 @@ void DlgMetExpArt::FillProjectTree(int state)
 void DlgMetExpArt::RefillArticleTree()
 {
     std::unordered_map<std::string, std::string> remembered;
-    for (HTREEITEM root = m_treeArticles.GetRootItem(); root != nullptr; root = m_treeArticles.GetNextSiblingItem(root))
+    std::unordered_set<std::string> closed;
+    for (HTREEITEM root = m_treeArticles.GetRootItem(); root != nullptr;
+         root = m_treeArticles.GetNextSiblingItem(root)) {
         SaveCheckedPaths(root, remembered);
+        SaveClosedPaths(root, {}, closed);
+    }
+    std::vector<std::string> selectedPath;
+    for (HTREEITEM item = m_treeArticles.GetSelectedItem(); item != nullptr; item = m_treeArticles.GetParentItem(item))
+        selectedPath.insert(selectedPath.begin(), m_treeArticles.GetItemText(item));
+    const int scrolled = m_treeArticles.GetScrollPos();
     m_treeArticles.DeleteAllItems();
     m_itemLines.clear();
 
@@ -295,10 +303,61 @@ void DlgMetExpArt::RefillArticleTree()
 
     for (HTREEITEM root = m_treeArticles.GetRootItem(); root != nullptr; root = m_treeArticles.GetNextSiblingItem(root))
         RestoreCheckedPaths(root, remembered);
-    for (HTREEITEM root = m_treeArticles.GetRootItem(); root != nullptr; root = m_treeArticles.GetNextSiblingItem(root))
+    for (HTREEITEM root = m_treeArticles.GetRootItem(); root != nullptr;
+         root = m_treeArticles.GetNextSiblingItem(root)) {
         UpdateCategoryStates(root);
-    if (HTREEITEM selected = m_treeArticles.GetSelectedItem())
+        if (!closed.empty())
+            RestoreClosedPaths(root, {}, closed);
+    }
+    m_treeArticles.SetScrollPos(scrolled);
+    if (HTREEITEM selected = FindArticlePath(selectedPath)) {
+        m_treeArticles.SelectItem(selected);
         m_treeArticles.EnsureVisible(selected);
+    }
+}
+
+void DlgMetExpArt::SaveClosedPaths(HTREEITEM item, const std::string& parentPath,
+                                   std::unordered_set<std::string>& closed) const
+{
+    if (!m_treeArticles.ItemHasChildren(item))
+        return;
+    const std::string path = parentPath + "\\" + m_treeArticles.GetItemText(item);
+    if (!m_treeArticles.IsExpanded(item))
+        closed.insert(path);
+    for (HTREEITEM child = m_treeArticles.GetChildItem(item); child != nullptr;
+         child = m_treeArticles.GetNextSiblingItem(child))
+        SaveClosedPaths(child, path, closed);
+}
+
+void DlgMetExpArt::RestoreClosedPaths(HTREEITEM item, const std::string& parentPath,
+                                      const std::unordered_set<std::string>& closed)
+{
+    if (!m_treeArticles.ItemHasChildren(item))
+        return;
+    const std::string path = parentPath + "\\" + m_treeArticles.GetItemText(item);
+    if (closed.count(path) != 0)
+        m_treeArticles.Expand(item, TVE_COLLAPSE);
+    for (HTREEITEM child = m_treeArticles.GetChildItem(item); child != nullptr;
+         child = m_treeArticles.GetNextSiblingItem(child))
+        RestoreClosedPaths(child, path, closed);
+}
+
+HTREEITEM DlgMetExpArt::FindArticlePath(const std::vector<std::string>& texts) const
+{
+    // The deepest item that still stands on the path: a leaf that left the tree leaves
+    // the selection on its category.
+    HTREEITEM found = nullptr;
+    HTREEITEM level = m_treeArticles.GetRootItem();
+    for (const std::string& text : texts) {
+        HTREEITEM match = level;
+        while (match != nullptr && m_treeArticles.GetItemText(match) != text)
+            match = m_treeArticles.GetNextSiblingItem(match);
+        if (match == nullptr)
+            break;
+        found = match;
+        level = m_treeArticles.GetChildItem(match);
+    }
+    return found;
 }
 
 void DlgMetExpArt::FillArticleLevel(CZodEVIFilterEntryArray& entries, const std::vector<std::string>& path,

@@ -118,6 +118,12 @@ private:
     std::string ItemPath(const SECTreeCtrl& tree, HTREEITEM item) const;
     // Every category's state from its articles, children first.
     void UpdateCategoryStates(HTREEITEM item);
+    // What a person looking at the article tree would lose in a rebuild, kept by path:
+    // the categories they closed and the item they stood on.
+    void SaveClosedPaths(HTREEITEM item, const std::string& parentPath, std::unordered_set<std::string>& closed) const;
+    void RestoreClosedPaths(HTREEITEM item, const std::string& parentPath,
+                            const std::unordered_set<std::string>& closed);
+    HTREEITEM FindArticlePath(const std::vector<std::string>& texts) const;
 
     CZodEVIBdr* m_bdr;
     // Built once per dialog: the schedule does not change while it is open.

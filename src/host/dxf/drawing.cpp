@@ -1,10 +1,9 @@
-// Reading a whole DXF drawing (one pass over the mapped file that cuts it into records,
-// then the header, the handle index and the dictionaries) and writing it back, copying
-// the bytes of everything that did not change.
+// Reading a whole DXF drawing (one pass over the file read into memory that cuts it into
+// records, then the header, the handle index and the dictionaries) and writing it back,
+// copying the bytes of everything that did not change.
 #include "host/dxf/drawing.hpp"
 
 #include <fcntl.h>
-#include <sys/mman.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -114,13 +113,9 @@ private:
     bool ok_ = true;
 };
 
-Source::~Source()
-{
-    if (mapping_)
-        munmap(mapping_, size_);
-}
+Source::~Source() = default;
 
-bool Source::Map(const std::string& path, std::string& error)
+bool Source::Load(const std::string& path, std::string& error)
 {
     const int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC);
     if (fd < 0) {
@@ -133,24 +128,34 @@ bool Source::Map(const std::string& path, std::string& error)
         close(fd);
         return false;
     }
-    if (st.st_size == 0) {
-        close(fd);
-        Own(std::string());
-        return true;
+    // One read of the size announced; a file that grows meanwhile is read to its end, one
+    // that shrinks is what is left of it.
+    std::size_t capacity = static_cast<std::size_t>(st.st_size) + 1;
+    std::unique_ptr<char[]> buffer(new char[capacity]);
+    std::size_t size = 0;
+    for (;;) {
+        if (size == capacity) {
+            std::unique_ptr<char[]> larger(new char[capacity * 2]);
+            std::memcpy(larger.get(), buffer.get(), size);
+            buffer = std::move(larger);
+            capacity *= 2;
+        }
+        const ssize_t n = read(fd, buffer.get() + size, capacity - size);
+        if (n < 0 && errno == EINTR)
+            continue;
+        if (n < 0) {
+            error = FormatString("« %s » : lecture impossible (%s)", path.c_str(), std::strerror(errno));
+            close(fd);
+            return false;
+        }
+        if (n == 0)
+            break;
+        size += static_cast<std::size_t>(n);
     }
-    void* p = mmap(nullptr, static_cast<std::size_t>(st.st_size), PROT_READ, MAP_PRIVATE, fd, 0);
-    const int mapErrno = errno;
     close(fd);
-    if (p == MAP_FAILED) {
-        error = FormatString("« %s » : lecture impossible (%s)", path.c_str(), std::strerror(mapErrno));
-        return false;
-    }
-    // One pass from start to end: read ahead, and drop pages behind.
-    madvise(p, static_cast<std::size_t>(st.st_size), MADV_SEQUENTIAL);
-    madvise(p, static_cast<std::size_t>(st.st_size), MADV_WILLNEED);
-    mapping_ = p;
-    data_ = static_cast<const char*>(p);
-    size_ = static_cast<std::size_t>(st.st_size);
+    read_ = std::move(buffer);
+    data_ = read_.get();
+    size_ = size;
     return true;
 }
 

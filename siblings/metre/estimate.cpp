@@ -2,9 +2,12 @@
 #include "estimate.hpp"
 
 #include "text/text.hpp"
+#include "velhost/editor.h"
+#include "velhost/files.h"
 
 #include <xlsxwriter.h>
 
+#include <cerrno>
 #include <cmath>
 #include <cstdio>
 #include <map>
@@ -314,16 +317,13 @@ FileResult WriteEstimateCsv(const std::string& path, const Estimate& estimate)
 FileResult WriteEstimateWorkbook(const std::string& path, const Estimate& estimate, const std::string& currency)
 {
     using K = SheetRow::Kind;
-    std::string temporary = path + ".tmp-XXXXXX";
-    const int fd = ::mkstemp(temporary.data());
-    if (fd < 0)
-        return FileResult::Failure(FormatString("Classeur « %s » : impossible de créer le fichier temporaire.", path.c_str()));
-    ::close(fd);
-    lxw_workbook* workbook = workbook_new(temporary.c_str());
-    if (workbook == nullptr) {
-        ::unlink(temporary.c_str());
+    // The library writes to a name: it is given the writer's temporary file.
+    VelAtomicFile file(path);
+    if (VelFileResult opened = file.open(); !opened)
+        return FileResult::Failure(opened.message);
+    lxw_workbook* workbook = workbook_new(file.temporaryPath().c_str());
+    if (workbook == nullptr)
         return FileResult::Failure(FormatString("Classeur « %s » : création impossible.", path.c_str()));
-    }
     lxw_worksheet* sheet = workbook_add_worksheet(workbook, "Devis");
     lxw_format* bold = workbook_add_format(workbook);
     format_set_bold(bold);
@@ -429,17 +429,19 @@ FileResult WriteEstimateWorkbook(const std::string& path, const Estimate& estima
         }
         }
     }
+    errno = 0;
     const lxw_error closed = workbook_close(workbook);
-    if (closed != LXW_NO_ERROR) {
-        ::unlink(temporary.c_str());
-        return FileResult::Failure(FormatString("Classeur « %s » : écriture impossible (%s).", path.c_str(),
-                                                lxw_strerror(closed)));
-    }
-    ::chmod(temporary.c_str(), 0644);
-    if (::rename(temporary.c_str(), path.c_str()) != 0) {
-        ::unlink(temporary.c_str());
-        return FileResult::Failure(FormatString("Classeur « %s » : remplacement impossible.", path.c_str()));
-    }
+    const int closeError = errno;
+    if (closed != LXW_NO_ERROR)
+        return FileResult::Failure(FormatString(
+            "Classeur « %s » non enregistré : %s ; rien n'est remplacé ; %s.", path.c_str(),
+            closeError != 0 ? velFileErrorReason(closeError).c_str() : "la bibliothèque des classeurs a échoué",
+            closeError != 0 ? velFileErrorAdvice(closeError).c_str() : "recommencez"));
+    VelFileResult committed = file.commit();
+    if (!committed)
+        return FileResult::Failure(committed.message);
+    if (!committed.message.empty())
+        acutPrintf("%s\n", committed.message.c_str());
     return {};
 }
 

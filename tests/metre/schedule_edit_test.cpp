@@ -199,7 +199,7 @@ TEST_F(ScheduleEditor, ScriptThatQuitsOrFailsLeavesTheFile)
         const char* expected;
     } cases[] = {
         {"cancelled", "supprimer " + kRegard + "\nannuler\n", 1, ""},
-        {"no change", "fin\n", 1, "aucune modification"},
+        {"looked at only: closed normally", "fin\n", 0, "aucune modification"},
         {"input ends", "supprimer " + kRegard + "\n", 1, "saisie interrompue"},
         {"unknown article", "supprimer X\\\\Y - Z\nfin\n", 1, "ligne 1 du script : aucun article « X\\\\Y - Z »"},
         {"bad value", "champ unitPrice " + kTuyau + "\ndouze\nfin\n", 1, "ligne 2 du script : champ « unitPrice » : nombre"},

@@ -5,6 +5,7 @@
 #include "schedule/art_template.hpp"
 #include "schedule/article.hpp"
 #include "schedule/insertion_map.hpp"
+#include "schedule/schedule_file_state.hpp"
 
 #include <memory>
 #include <set>
@@ -110,6 +111,8 @@ public:
 
     std::string path;
     int nextNumber = 1;
+    // Kept by the exchange with the metre module; Clear leaves it alone.
+    CZodEVIBdrFileState fileState;
 
 private:
     std::vector<std::unique_ptr<CZodEVIArticle>> articles;

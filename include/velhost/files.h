@@ -28,8 +28,8 @@ struct VelWriteOptions {
 // Replaces `path` with `content`: the bytes go to a temporary file in the same folder,
 // which is flushed to disk, takes the target's permissions (a new file those the umask
 // allows), and is renamed over the target; the folder is then flushed too. A symbolic
-// link is followed, so the file it names is replaced. On failure the temporary file is
-// removed and the target is as it was.
+// link is followed, so the file it names is replaced; a file protected from writing is
+// not replaced. On failure the temporary file is removed and the target is as it was.
 VelFileResult velWriteFileAtomically(const std::string& path, std::string_view content,
                                      const VelWriteOptions& options = {});
 

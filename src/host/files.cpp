@@ -221,6 +221,12 @@ VelFileResult VelAtomicFile::open() {
   struct stat st {};
   existed_ = ::stat(target_.c_str(), &st) == 0;
   if (existed_ && S_ISDIR(st.st_mode)) return {false, EISDIR, Failure(path_, "", EISDIR, false)};
+  // A rename would replace a file its owner protected from writing: it is refused as a
+  // write into it would be.
+  if (existed_ && ::access(target_.c_str(), W_OK) != 0) {
+    const int error = errno;
+    return {false, error, Failure(path_, "le fichier est protégé en écriture", error, true)};
+  }
   for (int attempt = 0;; ++attempt) {
     temporary_ = SiblingName(target_, ".tmp-");
     fd_ = Calls().open(temporary_.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600);
@@ -392,6 +398,10 @@ VelFileLock::VelFileLock(const std::string& path, int waitSeconds) {
     const std::string step = error == EAGAIN ? FormatString("depuis %d s", waitSeconds) : "pendant la pose du verrou";
     result_ = {false, error, Failure(path, step, error, ::access(path.c_str(), F_OK) == 0)};
   };
+  if (fs::path(ResolveLinks(path)).filename().empty()) {
+    failure(path.empty() ? ENOENT : EISDIR);
+    return;
+  }
   // Whoever may replace the file may write in its folder, and so may take its lock.
   int fd = Calls().open(lockFile.c_str(), O_RDWR | O_CREAT | O_EXCL | O_CLOEXEC, 0644);
   if (fd >= 0) {

@@ -91,6 +91,9 @@ TEST(VelFileWriter, FailuresSayWhyAndLeaveNothing)
          "créé ; vérifiez le chemin du fichier."},
         {"a folder in the way", dir.File("dossier"), "non enregistré : un dossier porte ce nom."},
     };
+    // Permissions do not hold back the superuser.
+    const std::string locked = dir.Write("protege.ini", "a=1");
+    chmod(locked.c_str(), 0444);
     for (const Case& c : cases) {
         SCOPED_TRACE(c.name);
         const VelFileResult result = velWriteFileAtomically(c.path, "x");
@@ -98,7 +101,13 @@ TEST(VelFileWriter, FailuresSayWhyAndLeaveNothing)
         EXPECT_EQ(result.message.rfind("Fichier « " + c.path + " »", 0), 0u) << result.message;
         EXPECT_NE(result.message.find(c.expected), std::string::npos) << result.message;
     }
-    EXPECT_EQ(EntriesIn(dir.path), 1u);
+    if (geteuid() != 0) {
+        const VelFileResult result = velWriteFileAtomically(locked, "a=2");
+        EXPECT_NE(result.message.find("permission refusée (le fichier est protégé en écriture)"), std::string::npos)
+            << result.message;
+        EXPECT_EQ(dir.Read("protege.ini"), "a=1");
+    }
+    EXPECT_EQ(EntriesIn(dir.path), 2u);
     EXPECT_EQ(EntriesIn(dir.path / "dossier"), 1u);
 }
 

@@ -314,6 +314,9 @@ void RecordPendingChange(CZodEVIBdr& bdr, std::function<void(CZodEVIBdr&)> chang
 
 bool Write(CZodEVIBdr& bdr)
 {
+    // No file to compare with nor to lock: the metre module says why nothing is written.
+    if (bdr.path.empty())
+        return Export(bdr);
     for (;;) {
         if (!FileReadable(bdr))
             return false;

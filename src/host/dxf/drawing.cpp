@@ -4,6 +4,7 @@
 #include "host/dxf/drawing.hpp"
 
 #include <fcntl.h>
+#include <sys/mman.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -113,7 +114,11 @@ private:
     bool ok_ = true;
 };
 
-Source::~Source() = default;
+Source::~Source()
+{
+    if (buffer_ != nullptr)
+        munmap(buffer_, capacity_);
+}
 
 bool Source::Load(const std::string& path, std::string& error)
 {
@@ -128,33 +133,49 @@ bool Source::Load(const std::string& path, std::string& error)
         close(fd);
         return false;
     }
+    const auto fail = [&](int err) {
+        error = FormatString("« %s » : lecture impossible (%s)", path.c_str(), std::strerror(err));
+        close(fd);
+        return false;
+    };
+    // Memory of its own rather than the heap: in large pages where the system has them,
+    // filling it costs no more than mapping the file did.
+    std::size_t capacity = static_cast<std::size_t>(st.st_size) + 1;
+    void* buffer = mmap(nullptr, capacity, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+    if (buffer == MAP_FAILED)
+        return fail(errno);
+    madvise(buffer, capacity, MADV_HUGEPAGE);
     // One read of the size announced; a file that grows meanwhile is read to its end, one
     // that shrinks is what is left of it.
-    std::size_t capacity = static_cast<std::size_t>(st.st_size) + 1;
-    std::unique_ptr<char[]> buffer(new char[capacity]);
     std::size_t size = 0;
     for (;;) {
         if (size == capacity) {
-            std::unique_ptr<char[]> larger(new char[capacity * 2]);
-            std::memcpy(larger.get(), buffer.get(), size);
-            buffer = std::move(larger);
+            void* larger = mremap(buffer, capacity, capacity * 2, MREMAP_MAYMOVE);
+            if (larger == MAP_FAILED) {
+                munmap(buffer, capacity);
+                return fail(errno);
+            }
+            buffer = larger;
             capacity *= 2;
         }
-        const ssize_t n = read(fd, buffer.get() + size, capacity - size);
+        const ssize_t n = read(fd, static_cast<char*>(buffer) + size, capacity - size);
         if (n < 0 && errno == EINTR)
             continue;
         if (n < 0) {
-            error = FormatString("« %s » : lecture impossible (%s)", path.c_str(), std::strerror(errno));
-            close(fd);
-            return false;
+            const int err = errno;
+            munmap(buffer, capacity);
+            return fail(err);
         }
         if (n == 0)
             break;
         size += static_cast<std::size_t>(n);
     }
     close(fd);
-    read_ = std::move(buffer);
-    data_ = read_.get();
+    if (buffer_ != nullptr)
+        munmap(buffer_, capacity_);
+    buffer_ = buffer;
+    capacity_ = capacity;
+    data_ = static_cast<const char*>(buffer);
     size_ = size;
     return true;
 }

@@ -24,15 +24,17 @@ public:
     ~Source();
     Source(const Source&) = delete;
     Source& operator=(const Source&) = delete;
-    // Reads the whole file into memory: a mapping would fault on every page that another
-    // program cut off the file while it is open, and the writer copies from it at save.
+    // Reads the whole file into memory: a mapping of the file would fault on every page
+    // that another program cut off it while it is open, and the writer copies from it at
+    // save.
     bool Load(const std::string& path, std::string& error);
     void Own(std::string content);
     std::string_view view() const { return {data_, size_}; }
 
 private:
     std::string owned_;
-    std::unique_ptr<char[]> read_;
+    void* buffer_ = nullptr;
+    std::size_t capacity_ = 0;
     const char* data_ = "";
     std::size_t size_ = 0;
 };

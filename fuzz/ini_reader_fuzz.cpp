@@ -16,12 +16,13 @@ namespace {
     std::abort();
 }
 
+// A line of the input, as a C string passes it (up to a zero byte).
 std::string NextLine(std::string_view& rest)
 {
     const std::size_t end = rest.find('\n');
-    const std::string line(rest.substr(0, end));
+    const std::string_view line = rest.substr(0, end);
     rest.remove_prefix(end == std::string_view::npos ? rest.size() : end + 1);
-    return line;
+    return std::string(line.substr(0, line.find('\0')));
 }
 
 // What a reader gives for a written value: blanks around it and one pair of quotes go.

@@ -209,7 +209,8 @@ bool Reload(CZodEVIBdr& bdr)
 // up; false, with the message, while it still does not read.
 bool FileReadable(CZodEVIBdr& bdr)
 {
-    if (!bdr.fileState.notRead || !SameFile(bdr.fileState.path, bdr.path) || Reload(bdr))
+    // A file that went away meanwhile is no longer in danger: the next write creates one.
+    if (!bdr.fileState.notRead || !SameFile(bdr.fileState.path, bdr.path) || Reload(bdr) || !bdr.fileState.notRead)
         return true;
     PrintNotRead(bdr);
     return false;
@@ -362,7 +363,12 @@ bool Write(CZodEVIBdr& bdr)
             return false;
         if (reload) {
             if (!Reload(bdr)) {
-                PrintNotRead(bdr);
+                if (bdr.fileState.notRead)
+                    PrintNotRead(bdr);
+                else
+                    acutPrintf("\nERREUR : le bordereau « %s » n'existe plus ; rien n'est enregistré. Le prochain "
+                               "enregistrement le recréera avec la version en mémoire.\n",
+                               bdr.path.c_str());
                 return false;
             }
         } else {

@@ -37,16 +37,19 @@ test: deps
 	cd $(ASAN_BUILD) && ctest --output-on-failure -j$(JOBS)
 	$(MAKE) fuzz
 
-# A short bounded run of the DXF reader's fuzz target (clang, libFuzzer).
+# A short bounded run of each reader's fuzz target (clang, libFuzzer) from its seeds.
 FUZZ_BUILD ?= build/fuzz
-FUZZ_SECONDS ?= 30
+FUZZ_SECONDS ?= 20
+FUZZ_TARGETS = dxf_reader schedule_reader ini_reader registry_reader script_input project_record
+FUZZ_SEEDS_dxf_reader = tests/data/dxf/fuzz tests/data/dxf
+FUZZ_SEEDS_script_input = tests/data/fuzz/script_input tests/apps/scripts tests/module/scripts
 fuzz: deps
 	cmake -S . -B $(FUZZ_BUILD) -DCMAKE_BUILD_TYPE=RelWithDebInfo -DVEL_FUZZ=ON \
 	  -DCMAKE_C_COMPILER=clang -DCMAKE_CXX_COMPILER=clang++
-	cmake --build $(FUZZ_BUILD) -j$(JOBS) --target fuzz_dxf_reader
-	mkdir -p $(FUZZ_BUILD)/corpus
-	$(FUZZ_BUILD)/bin/fuzz_dxf_reader -max_total_time=$(FUZZ_SECONDS) -max_len=32768 \
-	  -timeout=10 -rss_limit_mb=2048 $(FUZZ_BUILD)/corpus tests/data/dxf/fuzz tests/data/dxf
+	cmake --build $(FUZZ_BUILD) -j$(JOBS) --target $(addprefix fuzz_,$(FUZZ_TARGETS))
+	$(foreach t,$(FUZZ_TARGETS),mkdir -p $(FUZZ_BUILD)/corpus/$(t) && \
+	  $(FUZZ_BUILD)/bin/fuzz_$(t) -max_total_time=$(FUZZ_SECONDS) -max_len=32768 -timeout=10 -rss_limit_mb=2048 \
+	  $(FUZZ_BUILD)/corpus/$(t) $(or $(FUZZ_SEEDS_$(t)),tests/data/fuzz/$(t)) &&) true
 
 # The example project end to end, on copies of its files in $(BUILD)/demo.
 demo: build

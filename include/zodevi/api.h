@@ -50,9 +50,13 @@ enum : std::int32_t {
 // Every function answers a status code and never throws; a null pointer answers
 // kZodEVIFailed (kZodEVINotFound for the price queries) and changes nothing.
 
-// Reads the schedule file into the current schedule (emptied first).
+// Reads the schedule file into the current schedule (emptied first). A file that exists
+// but does not read is then never written over, until a read of it succeeds.
 ZODEVI_EXPORT std::int32_t ZodEVI_ReadBdr();
-// Writes the current schedule to its file.
+// Writes the current schedule to its file. kZodEVIFailed, with a message on the command
+// line, when the file did not read or changed on disk since it was read or written here
+// (an interactive user is asked whether to read it again and make the changes of memory
+// on it, or to replace it), or when the file cannot be written.
 ZODEVI_EXPORT std::int32_t ZodEVI_WriteBdr();
 // Brings a network's articles up to date: network index (0 EP ... 12 other), network
 // name, then models, pipe supplies, fittings, fitting supplies, ducts, trench materials,
@@ -79,13 +83,15 @@ ZODEVI_EXPORT std::int32_t ZodEVI_UpdateBdrEpRbt(const CZodEVIRealArray* classLi
 // general network group. kZodEVINotFound (price set to 0) when none counts it.
 ZODEVI_EXPORT std::int32_t ZodEVI_GetBdrPrice(const std::int32_t* selector, const std::string* itemName,
                                               double* price, std::string networkName);
-// Network name -> price text of every network group with such an article.
+// Network name -> price text of every network group with such an article; the map is
+// emptied first, whatever the answer.
 ZODEVI_EXPORT std::int32_t ZodEVI_GetBdrPriceRsx(const std::int32_t* selector, const std::string* itemName,
                                                  CZodEVIStringMap* prices);
 // Sets the unit price of the article counting a quantity (in memory; write to keep it).
 ZODEVI_EXPORT std::int32_t ZodEVI_SetBdrPrice(const std::int32_t* selector, const std::string* itemName,
                                               const double* price, std::string networkName);
-// Opens the schedule's editor on the article counting a quantity.
+// Opens the schedule's editor on the article counting a quantity; kZodEVIOk when it was
+// opened and closed normally, whether anything changed or not.
 ZODEVI_EXPORT std::int32_t ZodEVI_ShowBdrPrice(const std::int32_t* selector, const std::string* itemName,
                                                std::string networkName);
 

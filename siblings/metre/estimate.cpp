@@ -3,10 +3,13 @@
 #include "estimate.hpp"
 
 #include "text/text.hpp"
+#include "velhost/editor.h"
+#include "velhost/files.h"
 
 #include <xlsxwriter.h>
 
 #include <algorithm>
+#include <cerrno>
 #include <cmath>
 #include <cstdio>
 #include <filesystem>
@@ -954,32 +957,35 @@ FileResult WriteWorkbookFile(const std::string& file, const Estimate& estimate, 
         WriteChart(workbook, chartSheet, estimate, currency);
     WriteChecksSheet(checksSheet, estimate, places, formats);
     WriteSourcesSheet(sourcesSheet, estimate, places, formats);
+    errno = 0;
     const lxw_error closed = workbook_close(workbook);
+    const int closeError = errno;
     if (closed != LXW_NO_ERROR)
-        return FileResult::Failure(FormatString("Classeur « %s » : écriture impossible (%s).", file.c_str(),
-                                                lxw_strerror(closed)));
+        return FileResult::Failure(FormatString(
+            "Classeur « %s » non enregistré : %s ; rien n'est remplacé ; %s.", file.c_str(),
+            closeError != 0 ? velFileErrorReason(closeError).c_str() : "la bibliothèque des classeurs a échoué",
+            closeError != 0 ? velFileErrorAdvice(closeError).c_str() : "recommencez"));
     return {};
 }
 
 FileResult WriteEstimateWorkbook(const std::string& path, const Estimate& estimate, const std::string& currency)
 {
-    std::string temporary = path + ".tmp-XXXXXX";
-    const int fd = ::mkstemp(temporary.data());
-    if (fd < 0)
-        return FileResult::Failure(FormatString("Classeur « %s » : impossible de créer le fichier temporaire.", path.c_str()));
-    ::close(fd);
-    if (FileResult written = WriteWorkbookFile(temporary, estimate, currency); !written) {
-        ::unlink(temporary.c_str());
+    // The library writes to a name: it is given the writer's temporary file.
+    VelAtomicFile file(path);
+    if (VelFileResult opened = file.open(); !opened)
+        return FileResult::Failure(opened.message);
+    if (FileResult written = WriteWorkbookFile(file.temporaryPath(), estimate, currency); !written) {
         // The message names the file the user asked for, not the temporary one.
+        const std::string& temporary = file.temporaryPath();
         if (const std::size_t at = written.message.find(temporary); at != std::string::npos)
             written.message.replace(at, temporary.size(), path);
         return written;
     }
-    ::chmod(temporary.c_str(), 0644);
-    if (::rename(temporary.c_str(), path.c_str()) != 0) {
-        ::unlink(temporary.c_str());
-        return FileResult::Failure(FormatString("Classeur « %s » : remplacement impossible.", path.c_str()));
-    }
+    VelFileResult committed = file.commit();
+    if (!committed)
+        return FileResult::Failure(committed.message);
+    if (!committed.message.empty())
+        acutPrintf("%s\n", committed.message.c_str());
     return {};
 }
 

@@ -3,8 +3,10 @@
 
 #include "text/text.hpp"
 #include "velhost/editor.h"
+#include "velhost/files.h"
 #include "velhost/ui.h"
 
+#include <algorithm>
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
@@ -61,6 +63,102 @@ std::pair<std::string, std::string> SplitVerb(const std::string& line)
 void ScriptError(const VelInputLine& line, const std::string& what)
 {
     acutPrintf("Bordereau, ligne %d du script : %s ; rien n'est modifié.\n", line.lineNumber, what.c_str());
+}
+
+
+// The session's changes made on a newer version of the file: deletions and additions by
+// tree path, modifications field by field, so that what another user changed in the same
+// article stays unless the session changed that very field. The changes then carry the
+// articles as written.
+ArticleVector Rebase(const ArticleVector& original, ArticleVector newer, std::vector<ScheduleChange>& changes)
+{
+    const auto find = [&](const std::string& treePath) {
+        return std::find_if(newer.begin(), newer.end(),
+                            [&](const auto& article) { return EqualsNoCase(article->treePath, treePath); });
+    };
+    for (ScheduleChange& change : changes) {
+        const auto there = find(change.article->treePath);
+        if (change.kind == kChangeDeleted) {
+            if (there != newer.end())
+                newer.erase(there);
+            continue;
+        }
+        const auto before = std::find_if(original.begin(), original.end(), [&](const auto& article) {
+            return EqualsNoCase(article->treePath, change.article->treePath);
+        });
+        if (there == newer.end()) {
+            newer.push_back(std::make_unique<CZodEVIArticle>(*change.article));
+            continue;
+        }
+        if (change.kind == kChangeModified && before != original.end()) {
+            for (const CZodEVIArticleField& field : ArticleFields())
+                if (FieldText(**before, field) != FieldText(*change.article, field))
+                    SetFieldText(**there, field, FieldText(*change.article, field));
+        } else {
+            **there = *change.article;
+        }
+        *change.article = **there;
+    }
+    return newer;
+}
+
+
+// Writes the session under the file's lock, unless another program changed the file since
+// the session read it: a script stops there; a user chooses between making the changes
+// again on the newer version and replacing it.
+bool WriteSession(const std::string& path, VelFileIdentity opened, const ScheduleEdit& edit,
+                  std::vector<ScheduleChange>& changes)
+{
+    std::vector<const CZodEVIArticle*> result = edit.Result();
+    ArticleVector newer;
+    for (;;) {
+        VelFileIdentity now;
+        {
+            const VelFileLock lock(path);
+            if (!lock.locked()) {
+                acutPrintf("Bordereau : %s\n", lock.result().message.c_str());
+                return false;
+            }
+            now = velFileIdentity(path);
+            if (opened.sameContent(now)) {
+                if (FileResult written = WriteScheduleFile(path, result); !written) {
+                    acutPrintf("%s\n", written.message.c_str());
+                    return false;
+                }
+                return true;
+            }
+        }
+        if (velUI().isScripted()) {
+            acutPrintf("Bordereau « %s » : modifié par un autre utilisateur ou programme pendant la saisie ; les "
+                       "modifications de la saisie ne sont pas enregistrées, pour ne pas perdre les siennes. "
+                       "Rouvrez le bordereau, puis recommencez.\n",
+                       path.c_str());
+            return false;
+        }
+        acutPrintf("Bordereau « %s » : modifié par un autre utilisateur ou programme pendant la saisie.\n",
+                   path.c_str());
+        acedInitGet(0, "Oui Non");
+        std::string answer;
+        const int status = acedGetKword(
+            "Reporter vos modifications sur sa nouvelle version (Non : la remplacer) ? [Oui/Non] <Oui> : ", answer);
+        if (status != RTNORM && status != RTNONE) {
+            acutPrintf("Bordereau « %s » : rien n'est enregistré.\n", path.c_str());
+            return false;
+        }
+        if (status == RTNORM && answer == "Non") {
+            opened = now;
+            continue;
+        }
+        ArticleVector fresh;
+        opened = velFileIdentity(path);
+        if (FileResult read = ReadScheduleFile(path, fresh); !read) {
+            acutPrintf("%s\nBordereau « %s » : rien n'est enregistré.\n", read.message.c_str(), path.c_str());
+            return false;
+        }
+        newer = Rebase(edit.Original(), std::move(fresh), changes);
+        result.assign(newer.size(), nullptr);
+        std::transform(newer.begin(), newer.end(), result.begin(), [](const auto& article) { return article.get(); });
+    }
 }
 
 } // namespace
@@ -227,6 +325,7 @@ int EditScheduleFile(const std::string& path, const std::string& treePath, std::
 {
     if (records == nullptr || actions == nullptr)
         return 2;
+    const VelFileIdentity opened = velFileIdentity(path);
     ArticleVector articles;
     if (FileResult read = ReadScheduleFile(path, articles); !read) {
         acutPrintf("%s\n", read.message.c_str());
@@ -239,13 +338,12 @@ int EditScheduleFile(const std::string& path, const std::string& treePath, std::
         return 1;
     std::vector<ScheduleChange> changes = edit.Changes();
     if (changes.empty()) {
+        // Looked at and closed: the editor ran normally.
         acutPrintf("Bordereau « %s » : aucune modification.\n", path.c_str());
-        return 1;
+        return 0;
     }
-    if (FileResult written = WriteScheduleFile(path, edit.Result()); !written) {
-        acutPrintf("%s\n", written.message.c_str());
+    if (!WriteSession(path, opened, edit, changes))
         return 3;
-    }
     int counts[4] = {};
     for (ScheduleChange& change : changes) {
         ++counts[change.kind];

@@ -3,6 +3,8 @@
 #include "schedule_file.hpp"
 
 #include "text/text.hpp"
+#include "velhost/editor.h"
+#include "velhost/files.h"
 
 #include <pugixml.hpp>
 
@@ -354,61 +356,6 @@ std::string ErrnoText(int error)
     return std::strerror(error);
 }
 
-bool WriteAll(int fd, std::string_view content, int& error)
-{
-    while (!content.empty()) {
-        const ssize_t written = ::write(fd, content.data(), content.size());
-        if (written < 0) {
-            if (errno == EINTR)
-                continue;
-            error = errno;
-            return false;
-        }
-        content.remove_prefix(static_cast<std::size_t>(written));
-    }
-    return true;
-}
-
-// Keeps the file as it is now under "<path>.bak", replacing an older backup in one step.
-bool KeepBackup(const std::string& path, int& error)
-{
-    const std::string backup = path + ".bak";
-    std::string staging = path + ".bak-XXXXXX";
-    const int fd = ::mkstemp(staging.data());
-    if (fd < 0) {
-        error = errno;
-        return false;
-    }
-    ::close(fd);
-    ::unlink(staging.c_str());
-    if (::link(path.c_str(), staging.c_str()) != 0) {
-        std::error_code copyError;
-        if (!std::filesystem::copy_file(path, staging, copyError)) {
-            error = copyError.value();
-            ::unlink(staging.c_str());
-            return false;
-        }
-    }
-    if (::rename(staging.c_str(), backup.c_str()) != 0) {
-        error = errno;
-        ::unlink(staging.c_str());
-        return false;
-    }
-    return true;
-}
-
-void SyncFolderOf(const std::string& path)
-{
-    std::filesystem::path folder = std::filesystem::path(path).parent_path();
-    if (folder.empty())
-        folder = ".";
-    const int fd = ::open(folder.c_str(), O_RDONLY | O_DIRECTORY);
-    if (fd >= 0) {
-        ::fsync(fd);
-        ::close(fd);
-    }
-}
-
 } // namespace
 
 bool SetFieldText(CZodEVIArticle& article, const CZodEVIArticleField& field, std::string_view text)
@@ -580,47 +527,22 @@ std::string ScheduleToXml(const std::vector<const CZodEVIArticle*>& articles)
 
 FileResult WriteFileAtomically(const std::string& path, std::string_view content, bool keepBackup)
 {
-    const auto failure = [&](const char* what, int error) {
-        return FileResult::Failure(FormatString("Fichier « %s » : %s (%s) ; le fichier précédent est conservé.",
-                                                path.c_str(), what, ErrnoText(error).c_str()));
-    };
-    std::string temporary = path + ".tmp-XXXXXX";
-    const int fd = ::mkstemp(temporary.data());
-    if (fd < 0)
-        return failure("impossible de créer le fichier temporaire", errno);
-    int error = 0;
-    struct stat previous {};
-    const bool existed = ::stat(path.c_str(), &previous) == 0;
-    ::fchmod(fd, existed ? (previous.st_mode & 07777) : 0644);
-    if (!WriteAll(fd, content, error) || ::fsync(fd) != 0) {
-        if (error == 0)
-            error = errno;
-        ::close(fd);
-        ::unlink(temporary.c_str());
-        return failure("écriture interrompue", error);
-    }
-    if (::close(fd) != 0) {
-        error = errno;
-        ::unlink(temporary.c_str());
-        return failure("écriture interrompue", error);
-    }
-    if (existed && keepBackup && !KeepBackup(path, error)) {
-        ::unlink(temporary.c_str());
-        return failure("copie de sauvegarde impossible", error);
-    }
-    if (::rename(temporary.c_str(), path.c_str()) != 0) {
-        error = errno;
-        ::unlink(temporary.c_str());
-        return failure("remplacement impossible", error);
-    }
-    SyncFolderOf(path);
-    return {};
+    VelWriteOptions options;
+    options.keepBackup = keepBackup;
+    VelFileResult written = velWriteFileAtomically(path, content, options);
+    if (written && !written.message.empty())
+        acutPrintf("%s\n", written.message.c_str());
+    return {written.ok, std::move(written.message)};
 }
 
 FileResult WriteScheduleFile(const std::string& path, const std::vector<const CZodEVIArticle*>& articles)
 {
     if (path.empty())
         return FileResult::Failure("Bordereau sans nom de fichier : rien n'est écrit.");
+    // Another program holding the schedule's lock is checking or writing it.
+    const VelFileLock lock(path);
+    if (!lock.locked())
+        return FileResult::Failure("Bordereau : " + lock.result().message);
     const ScheduleWriter text = WriteSchedule(articles);
     FileResult result = WriteFileAtomically(path, text.Text(), true);
     if (!result)

@@ -13,6 +13,8 @@
 #include <cstring>
 
 #include "host/dxf/drawing.hpp"
+#include "velhost/editor.h"
+#include "velhost/files.h"
 #include "text/text.hpp"
 
 using vel::dxf::DrawingFile;
@@ -560,7 +562,7 @@ std::size_t AcDbDatabase::objectCount() const
 bool velOpenDrawing(const std::string& path, std::unique_ptr<AcDbDatabase>& out, std::string& error)
 {
     auto source = std::make_unique<vel::dxf::Source>();
-    if (!source->Map(path, error))
+    if (!source->Load(path, error))
         return false;
     return DrawingFile::Read(std::move(source), path, out, error);
 }
@@ -587,52 +589,26 @@ bool velWriteDrawing(AcDbDatabase& database, std::string& out, std::string& erro
 
 bool velSaveDrawing(AcDbDatabase& database, const std::string& path, std::string& error)
 {
-    // Written beside the target and renamed over it once complete, so that a failure
-    // leaves the previous file as it was.
-    std::string temp = path + ".XXXXXX";
-    const int fd = mkstemp(temp.data());
-    auto failure = [&](const char* what, int err) {
-        error = FormatString("« %s » : %s (%s)", path.c_str(), what, std::strerror(err));
-        return false;
-    };
-    if (fd < 0)
-        return failure("enregistrement impossible", errno);
-    struct stat st {};
-    if (stat(path.c_str(), &st) == 0)
-        fchmod(fd, st.st_mode & 07777);
-    else {
-        const mode_t mask = umask(0);
-        umask(mask);
-        fchmod(fd, 0666 & ~mask);
-    }
-    int writeErrno = 0;
+    VelAtomicFile file(path);
+    VelFileResult result = file.open();
     std::string writeError;
-    const bool written = database.file().Write(
-        [&](std::string_view piece) {
-            while (!piece.empty()) {
-                const ssize_t n = write(fd, piece.data(), piece.size());
-                if (n < 0) {
-                    if (errno == EINTR)
-                        continue;
-                    writeErrno = errno;
-                    return false;
-                }
-                piece.remove_prefix(static_cast<std::size_t>(n));
-            }
-            return true;
-        },
-        writeError);
-    if (!written || fsync(fd) != 0) {
-        const int err = writeErrno ? writeErrno : errno;
-        close(fd);
-        unlink(temp.c_str());
-        return failure("écriture impossible", err);
+    if (result && !database.file().Write(
+                      [&](std::string_view piece) {
+                          result = file.write(piece);
+                          return result.ok;
+                      },
+                      writeError)) {
+        error = result ? FormatString("« %s » : %s", path.c_str(), writeError.c_str()) : result.message;
+        return false;
     }
-    if (close(fd) != 0 || rename(temp.c_str(), path.c_str()) != 0) {
-        const int err = errno;
-        unlink(temp.c_str());
-        return failure("enregistrement impossible", err);
+    if (result)
+        result = file.commit();
+    if (!result) {
+        error = result.message;
+        return false;
     }
+    if (!result.message.empty())
+        acutPrintf("%s\n", result.message.c_str());
     database.file().fileName = path;
     database.file().modified = false;
     return true;

@@ -3,6 +3,9 @@
 #pragma once
 
 #include <string>
+#include <string_view>
+#include <utility>
+#include <vector>
 
 // The module whose code runs (its appId), null for the host itself.
 void* velCurrentApp();
@@ -25,8 +28,8 @@ std::string velAppPath(void* appId);
 // Converts "\" to "/" so that names written for Windows find Linux files.
 std::string velNativePath(const std::string& name);
 
-// Replaces a file once its new content is completely on disk, keeping its mode; false
-// with errno set, the old file untouched, on failure.
+// Replaces a file with velWriteFileAtomically; false with errno set, the old file
+// untouched, on failure.
 bool velReplaceFile(const std::string& fileName, const std::string& content);
 
 // Why the process's terminal cannot show a full-screen dialog (input or output not a
@@ -38,3 +41,21 @@ bool velDialogScreenShowing();
 // Gives the terminal back to the command line (a question to ask) until the dialog's
 // screen view next draws.
 void velSuspendDialogScreen();
+
+// INI text as Windows reads and writes it, apart from the file: the value of a key; the
+// names WritePrivateProfileString accepts; the text with a key set, a key removed (null
+// value) or a section removed (null key), false when that changes nothing.
+std::string velIniValue(const std::string& content, std::string_view section, std::string_view key,
+                        std::string_view def, std::size_t bufferSize);
+bool velIniNamesValid(const char* section, const char* key, const char* value);
+bool velIniSetValue(std::string& content, const char* section, const char* key, const char* value);
+
+// The registry file's text apart from the file: its keys with their values, read (false
+// with a French message naming the file and the line) and written back.
+struct VelRegistryKey {
+  std::string path;  // ROOT\a\b, as first written
+  std::vector<std::pair<std::string, std::string>> values;
+};
+bool velParseRegistry(const std::string& text, const std::string& fileName, std::vector<VelRegistryKey>& keys,
+                      std::string& error);
+std::string velSerializeRegistry(const std::vector<VelRegistryKey>& keys);

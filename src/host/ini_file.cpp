@@ -1,9 +1,6 @@
 // INI files read and written as Windows does: sections and keys without regard to
 // case, values trimmed and unquoted, and a write that keeps every other byte.
-#include <unistd.h>
-
 #include <cerrno>
-#include <cstdio>
 #include <filesystem>
 #include <fstream>
 #include <sstream>
@@ -11,6 +8,7 @@
 
 #include "host_internal.h"
 #include "text/text.hpp"
+#include "velhost/files.h"
 #include "velhost/profile.h"
 
 namespace fs = std::filesystem;
@@ -91,69 +89,34 @@ bool HasBreak(const char* s) { return s != nullptr && std::string_view(s).find_f
 }  // namespace
 
 bool velReplaceFile(const std::string& fileName, const std::string& content) {
-  const fs::path target(fileName);
-  std::error_code ec;
-  const fs::path folder = target.has_parent_path() ? target.parent_path() : fs::path(".");
-  if (!fs::is_directory(folder, ec)) {
-    errno = ENOENT;
-    return false;
-  }
-  const fs::path temp = folder / ("." + target.filename().string() + ".tmp" + std::to_string(getpid()));
-  FILE* f = std::fopen(temp.c_str(), "wb");
-  if (f == nullptr) return false;
-  const bool written = std::fwrite(content.data(), 1, content.size(), f) == content.size() &&
-                       std::fflush(f) == 0 && fsync(fileno(f)) == 0;
-  const int writeErrno = errno;
-  if (std::fclose(f) != 0 || !written) {
-    std::remove(temp.c_str());
-    errno = written ? EIO : writeErrno;
-    return false;
-  }
-  if (fs::exists(target, ec)) fs::permissions(temp, fs::status(target, ec).permissions(), ec);
-  if (std::rename(temp.c_str(), target.c_str()) != 0) {
-    const int renameErrno = errno;
-    std::remove(temp.c_str());
-    errno = renameErrno;
-    return false;
-  }
-  return true;
+  const VelFileResult written = velWriteFileAtomically(fileName, content);
+  if (!written) errno = written.error;
+  return written.ok;
 }
 
-std::string velGetPrivateProfileString(std::string_view section, std::string_view key,
-                                       std::string_view def, const std::string& fileName,
-                                       std::size_t bufferSize) {
-  std::string content;
-  if (!fileName.empty() && ReadWhole(fileName, content)) {
-    bool endsWithBreak = false;
-    bool inSection = false;
-    for (const std::string& line : SplitLines(content, endsWithBreak)) {
-      if (auto name = SectionOf(line)) {
-        inSection = EqualsNoCase(*name, Trim(section));
-        continue;
-      }
-      if (!inSection) continue;
-      if (auto k = KeyOf(line); k && EqualsNoCase(*k, Trim(key)))
-        return CutTo(Unquote(ValueOf(line)), bufferSize);
+std::string velIniValue(const std::string& content, std::string_view section, std::string_view key,
+                        std::string_view def, std::size_t bufferSize) {
+  bool endsWithBreak = false;
+  bool inSection = false;
+  for (const std::string& line : SplitLines(content, endsWithBreak)) {
+    if (auto name = SectionOf(line)) {
+      inSection = EqualsNoCase(*name, Trim(section));
+      continue;
     }
+    if (!inSection) continue;
+    if (auto k = KeyOf(line); k && EqualsNoCase(*k, Trim(key))) return CutTo(Unquote(ValueOf(line)), bufferSize);
   }
   return CutTo(Trim(def), bufferSize);
 }
 
-bool velWritePrivateProfileString(const char* section, const char* key, const char* value,
-                                  const std::string& fileName) {
-  if (fileName.empty() || section == nullptr || Trim(section).empty() || HasBreak(section) ||
-      HasBreak(key) || HasBreak(value) || std::string_view(section).find(']') != std::string_view::npos ||
-      (key != nullptr && (Trim(key).empty() || std::string_view(key).find('=') != std::string_view::npos ||
-                          Trim(key).front() == '[' || Trim(key).front() == ';'))) {
-    errno = EINVAL;
-    return false;
-  }
-  std::string content;
-  std::error_code ec;
-  if (fs::exists(fileName, ec) && !ReadWhole(fileName, content)) {
-    if (errno == 0) errno = EACCES;
-    return false;
-  }
+bool velIniNamesValid(const char* section, const char* key, const char* value) {
+  return section != nullptr && !Trim(section).empty() && !HasBreak(section) && !HasBreak(key) && !HasBreak(value) &&
+         std::string_view(section).find(']') == std::string_view::npos &&
+         (key == nullptr || (!Trim(key).empty() && std::string_view(key).find('=') == std::string_view::npos &&
+                             Trim(key).front() != '[' && Trim(key).front() != ';'));
+}
+
+bool velIniSetValue(std::string& content, const char* section, const char* key, const char* value) {
   bool endsWithBreak = true;
   std::vector<std::string> lines = SplitLines(content, endsWithBreak);
   const std::string eol = (!lines.empty() && !lines.front().empty() && lines.front().back() == '\r') ? "\r\n" : "\n";
@@ -173,7 +136,7 @@ bool velWritePrivateProfileString(const char* section, const char* key, const ch
   }
 
   if (key == nullptr) {
-    if (header == lines.size()) return true;
+    if (header == lines.size()) return false;
     lines.erase(lines.begin() + static_cast<std::ptrdiff_t>(header), lines.begin() + static_cast<std::ptrdiff_t>(end));
   } else {
     std::size_t found = lines.size();
@@ -183,7 +146,7 @@ bool velWritePrivateProfileString(const char* section, const char* key, const ch
         break;
       }
     if (value == nullptr) {
-      if (found == lines.size()) return true;
+      if (found == lines.size()) return false;
       lines.erase(lines.begin() + static_cast<std::ptrdiff_t>(found));
     } else if (found != lines.size()) {
       lines[found] = std::string(*KeyOf(lines[found])) + "=" + value + cr;
@@ -202,5 +165,37 @@ bool velWritePrivateProfileString(const char* section, const char* key, const ch
     out += lines[i];
     if (i + 1 < lines.size() || endsWithBreak) out += '\n';
   }
-  return velReplaceFile(fileName, out);
+  content = std::move(out);
+  return true;
+}
+
+std::string velGetPrivateProfileString(std::string_view section, std::string_view key,
+                                       std::string_view def, const std::string& fileName,
+                                       std::size_t bufferSize) {
+  std::string content;
+  if (fileName.empty() || !ReadWhole(fileName, content)) content.clear();
+  return velIniValue(content, section, key, def, bufferSize);
+}
+
+bool velWritePrivateProfileString(const char* section, const char* key, const char* value,
+                                  const std::string& fileName) {
+  if (fileName.empty() || !velIniNamesValid(section, key, value)) {
+    errno = EINVAL;
+    return false;
+  }
+  // Read, changed and written under the lock, so that two programs writing different
+  // keys at the same time both keep theirs.
+  const VelFileLock lock(fileName);
+  if (!lock.locked()) {
+    errno = lock.result().error;
+    return false;
+  }
+  std::string content;
+  std::error_code ec;
+  if (fs::exists(fileName, ec) && !ReadWhole(fileName, content)) {
+    if (errno == 0) errno = EACCES;
+    return false;
+  }
+  if (!velIniSetValue(content, section, key, value)) return true;
+  return velReplaceFile(fileName, content);
 }

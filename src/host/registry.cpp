@@ -4,11 +4,13 @@
 #include <cerrno>
 #include <filesystem>
 #include <fstream>
+#include <iterator>
 #include <sstream>
 #include <vector>
 
 #include "host_internal.h"
 #include "text/text.hpp"
+#include "velhost/files.h"
 #include "velhost/profile.h"
 
 namespace fs = std::filesystem;
@@ -19,10 +21,7 @@ const char* const kRoots[] = {"HKEY_LOCAL_MACHINE", "HKEY_CURRENT_USER", "HKEY_C
                               "HKEY_USERS", "HKEY_PERFORMANCE_DATA", "HKEY_CURRENT_CONFIG",
                               "HKEY_DYN_DATA"};
 
-struct Key {
-  std::string path;  // ROOT\a\b, as first written
-  std::vector<std::pair<std::string, std::string>> values;
-};
+using Key = VelRegistryKey;
 
 std::string Escape(std::string_view text) {
   std::string out;
@@ -71,10 +70,47 @@ bool Load(std::vector<Key>& keys, std::string& error) {
   std::error_code ec;
   if (!fs::exists(file, ec)) return true;
   std::ifstream in(file, std::ios::binary);
-  if (!in) {
+  std::string text;
+  if (in) text.assign(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
+  if (!in.is_open() || in.bad()) {
     error = FormatString("%s : lecture impossible.", file.c_str());
     return false;
   }
+  return velParseRegistry(text, file, keys, error);
+}
+
+// ROOT\a\b with the root spelt as the table has it and no empty level; "" when invalid.
+std::string FullPath(std::string_view root, std::string_view keyPath) {
+  const char* rootName = nullptr;
+  for (const char* r : kRoots)
+    if (EqualsNoCase(root, r)) rootName = r;
+  if (rootName == nullptr || keyPath.empty()) return {};
+  std::string out = rootName;
+  std::string level;
+  auto flush = [&]() {
+    if (!level.empty()) out += "\\" + level;
+    level.clear();
+  };
+  for (char c : keyPath) {
+    if (c == '\\' || c == '/') flush();
+    else if (c == '\n' || c == '\r' || c == ']') return {};
+    else level += c;
+  }
+  flush();
+  return out == rootName ? std::string() : out;
+}
+
+Key* FindKey(std::vector<Key>& keys, const std::string& path) {
+  for (Key& k : keys)
+    if (EqualsNoCase(k.path, path)) return &k;
+  return nullptr;
+}
+
+}  // namespace
+
+bool velParseRegistry(const std::string& text, const std::string& file, std::vector<VelRegistryKey>& keys,
+                      std::string& error) {
+  std::istringstream in(text);
   std::string line;
   int number = 0;
   while (std::getline(in, line)) {
@@ -111,7 +147,7 @@ bool Load(std::vector<Key>& keys, std::string& error) {
   return true;
 }
 
-std::string Serialize(const std::vector<Key>& keys) {
+std::string velSerializeRegistry(const std::vector<VelRegistryKey>& keys) {
   std::string out;
   for (const Key& k : keys) {
     out += "[" + k.path + "]\n";
@@ -121,35 +157,6 @@ std::string Serialize(const std::vector<Key>& keys) {
   }
   return out;
 }
-
-// ROOT\a\b with the root spelt as the table has it and no empty level; "" when invalid.
-std::string FullPath(std::string_view root, std::string_view keyPath) {
-  const char* rootName = nullptr;
-  for (const char* r : kRoots)
-    if (EqualsNoCase(root, r)) rootName = r;
-  if (rootName == nullptr || keyPath.empty()) return {};
-  std::string out = rootName;
-  std::string level;
-  auto flush = [&]() {
-    if (!level.empty()) out += "\\" + level;
-    level.clear();
-  };
-  for (char c : keyPath) {
-    if (c == '\\' || c == '/') flush();
-    else if (c == '\n' || c == '\r' || c == ']') return {};
-    else level += c;
-  }
-  flush();
-  return out == rootName ? std::string() : out;
-}
-
-Key* FindKey(std::vector<Key>& keys, const std::string& path) {
-  for (Key& k : keys)
-    if (EqualsNoCase(k.path, path)) return &k;
-  return nullptr;
-}
-
-}  // namespace
 
 bool velIsRegistryRoot(std::string_view name) {
   for (const char* r : kRoots)
@@ -184,9 +191,14 @@ bool velRegQueryValue(std::string_view root, std::string_view keyPath, std::stri
 bool velRegSetValue(std::string_view root, std::string_view keyPath, std::string_view valueName,
                     std::string_view value) {
   const std::string path = FullPath(root, keyPath);
+  if (path.empty()) return false;
+  std::error_code ec;
+  fs::create_directories(velHostSettings().profileDir, ec);
+  // Read, changed and written under the lock: two hosts of one profile keep both values.
+  const VelFileLock lock(velRegistryFile());
   std::vector<Key> keys;
   std::string error;
-  if (path.empty() || !Load(keys, error)) return false;
+  if (!lock.locked() || !Load(keys, error)) return false;
   Key* key = FindKey(keys, path);
   if (key == nullptr) {
     keys.push_back({path, {}});
@@ -200,7 +212,5 @@ bool velRegSetValue(std::string_view root, std::string_view keyPath, std::string
       break;
     }
   if (!replaced) key->values.emplace_back(std::string(valueName), std::string(value));
-  std::error_code ec;
-  fs::create_directories(velHostSettings().profileDir, ec);
-  return velReplaceFile(velRegistryFile(), Serialize(keys));
+  return velReplaceFile(velRegistryFile(), velSerializeRegistry(keys));
 }

@@ -412,7 +412,7 @@ std::optional<std::string> velStripScriptComment(const std::string& line) {
       break;
     }
   }
-  const auto last = text.find_last_not_of(" \t");
+  const auto last = text.find_last_not_of(" \t\r");
   text.erase(last == std::string::npos ? 0 : last + 1);
   return text;
 }

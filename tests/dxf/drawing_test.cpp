@@ -4,9 +4,14 @@
 
 #include <gtest/gtest.h>
 
+#include <unistd.h>
+
+#include <filesystem>
 #include <fstream>
 #include <sstream>
 
+#include "../host/file_faults.hpp"
+#include "../host/temp_dir.hpp"
 #include "velhost/dbase.h"
 
 namespace {
@@ -390,23 +395,65 @@ TEST(Drawing, OpenAndSaveReportFileErrors)
     EXPECT_EQ(error.rfind("« /nonexistent/plan.dxf » : impossible d'ouvrir le fichier", 0), 0u) << error;
     AcDbDatabase fresh;
     EXPECT_FALSE(velSaveDrawing(fresh, "/nonexistent/plan.dxf", error));
-    EXPECT_EQ(error.rfind("« /nonexistent/plan.dxf » : enregistrement impossible", 0), 0u) << error;
+    EXPECT_EQ(error.rfind("Fichier « /nonexistent/plan.dxf » non enregistré : dossier introuvable", 0), 0u) << error;
 }
 
-TEST(Drawing, SaveReplacesTheFileOnlyWhenComplete)
+TEST(Drawing, SaveThatFailsAnywhereLeavesThePreviousDrawing)
 {
-    const std::string path = ::testing::TempDir() + "vel_save_test.dxf";
-    {
-        std::ofstream(path) << "ancien contenu";
-    }
-    AcDbDatabase db;
+    TempDir dir;
+    const std::string original = Slurp(Fixture("r2018.dxf"));
+    const std::string path = dir.File("plan.dxf");
+    std::unique_ptr<AcDbDatabase> db;
     std::string error;
-    ASSERT_TRUE(velSaveDrawing(db, path, error)) << error;
-    EXPECT_EQ(db.fileName(), path);
-    std::unique_ptr<AcDbDatabase> back;
-    ASSERT_TRUE(velOpenDrawing(path, back, error)) << error;
-    EXPECT_EQ(back->dxfVersion(), "AC1032");
-    std::remove(path.c_str());
+    bool saved = false;
+    const int calls = ForEveryFailingCall(
+        [&] {
+            dir.Write("plan.dxf", original);
+            db = Open(path);
+            AcDbObjectId layer;
+            db->addLayer("NOUVEAU", layer);
+        },
+        [&] { saved = velSaveDrawing(*db, path, error); },
+        [&](const FaultRun& run) {
+            SCOPED_TRACE(run.failed + " n° " + std::to_string(run.calls));
+            auto back = Open(path);
+            ASSERT_NE(back, nullptr);
+            if (run.committed) {
+                EXPECT_TRUE(saved);
+                AcDbObjectId layer;
+                EXPECT_EQ(back->getLayerId("NOUVEAU", layer), Acad::eOk);
+                return;
+            }
+            EXPECT_FALSE(saved);
+            EXPECT_EQ(Slurp(path), original);
+            EXPECT_EQ(error.rfind("Fichier « " + path + " » non enregistré : " +
+                                      velFileErrorReason(FileFaults::ErrorOf(run.failed)),
+                                  0),
+                      0u)
+                << error;
+            EXPECT_NE(error.find("Le fichier précédent est conservé tel quel"), std::string::npos) << error;
+            EXPECT_EQ(std::distance(std::filesystem::directory_iterator(dir.path), {}), 1) << "no temporary file";
+        });
+    EXPECT_GT(calls, 8);
+}
+
+TEST(Drawing, FileCutShortWhileOpenDoesNotReachTheDrawing)
+{
+    TempDir dir;
+    const std::string original = Slurp(Fixture("r2018.dxf"));
+    const std::string path = dir.Write("plan.dxf", original);
+    auto db = Open(path);
+    ASSERT_NE(db, nullptr);
+    // Another program empties the file while the drawing is open.
+    ASSERT_EQ(truncate(path.c_str(), 0), 0);
+    EXPECT_EQ(Written(*db), original);
+    AcDbObjectId layer;
+    ASSERT_EQ(db->addLayer("APRES", layer), Acad::eOk);
+    std::string error;
+    ASSERT_TRUE(velSaveDrawing(*db, path, error)) << error;
+    auto back = Open(path);
+    ASSERT_NE(back, nullptr);
+    EXPECT_EQ(back->getLayerId("APRES", layer), Acad::eOk);
 }
 
 }  // namespace

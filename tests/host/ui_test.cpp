@@ -22,7 +22,7 @@ TEST(ScriptComment, StrippedOnlyWhereItStarts)
     };
     const Case cases[] = {
         {"; tout le commentaire", nullptr}, {"   ;indenté", nullptr}, {"OPEN plan.dxf ; le plan", "OPEN plan.dxf"},
-        {"SETVAR A;B", "SETVAR A;B"}, {"", ""}, {"Non\r", "Non"}, {"  espaces  ", "  espaces"},
+        {"SETVAR A;B", "SETVAR A;B"}, {"", ""}, {"Non\r", "Non"}, {"Non\r\r", "Non"}, {"  espaces  ", "  espaces"},
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.line);

@@ -4,6 +4,7 @@
 #include "estimate.hpp"
 #include "metre_services.hpp"
 
+#include "../host/file_faults.hpp"
 #include "../host/temp_dir.hpp"
 #include "velhost/dbase.h"
 #include "velhost/documents.h"
@@ -550,6 +551,41 @@ TEST_F(EstimateService, EstimatesAreWrittenBesideTheDrawingAndRecordedInIt)
     EXPECT_EQ(records[0].workbookPath, dir.File("Devis.xlsx"));
     EXPECT_EQ(records[0].lineCount, 4);
     EXPECT_DOUBLE_EQ(records[1].totalInclTax, 11894.51);
+}
+
+TEST_F(EstimateService, WriteThatFailsAnywhereLeavesEachFileWholeAndSaysWhich)
+{
+    acDocManager->createDocument(std::move(db), dir.File("plan.dxf"));
+    std::vector<CZodEVIAssocLine*> pointers = Pointers();
+    ASSERT_EQ(metre::ShowEstimate("Devis", &pointers), 0) << output.str();
+    const std::string workbook = dir.Read("Devis.xlsx"), csv = dir.Read("Devis.csv");
+    const std::size_t entries = std::distance(std::filesystem::directory_iterator(dir.path), {});
+    lines[0].label = "Tuyau PVC 200 (modifié)";
+    int status = 0;
+    ForEveryFailingCall(
+        [&] {
+            dir.Write("Devis.xlsx", workbook);
+            dir.Write("Devis.csv", csv);
+            output.str("");
+        },
+        [&] { status = metre::ShowEstimate("Devis", &pointers); },
+        [&](const FaultRun& run) {
+            SCOPED_TRACE(run.failed + " n° " + std::to_string(run.calls));
+            const std::string nowWorkbook = dir.Read("Devis.xlsx"), nowCsv = dir.Read("Devis.csv");
+            EXPECT_TRUE(nowWorkbook == workbook || nowWorkbook.rfind("PK\x03\x04", 0) == 0);
+            EXPECT_TRUE(nowCsv == csv || nowCsv.find("(modifié)") != std::string::npos);
+            EXPECT_EQ(std::distance(std::filesystem::directory_iterator(dir.path), {}), entries);
+            if (status == 0)
+                return;
+            const std::string reason = velFileErrorReason(FileFaults::ErrorOf(run.failed));
+            const bool workbookFailed =
+                output.str().find("Fichier « " + dir.File("Devis.xlsx") + " » non enregistré : " + reason) !=
+                std::string::npos;
+            const bool csvFailed = output.str().find("Fichier « " + dir.File("Devis.csv") +
+                                                     " » non enregistré : " + reason) != std::string::npos;
+            ASSERT_TRUE(workbookFailed || csvFailed) << output.str();
+            EXPECT_EQ(workbookFailed ? nowWorkbook : nowCsv, workbookFailed ? workbook : csv);
+        });
 }
 
 TEST_F(EstimateService, RefusedWithoutDrawingOrWithABadName)

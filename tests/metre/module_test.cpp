@@ -3,7 +3,9 @@
 #include "schedule/schedule_exchange.hpp"
 
 #include "../host/temp_dir.hpp"
+#include "module/service_api.hpp"
 #include "module/siblings.hpp"
+#include "ui/config_page.hpp"
 #include "velhost/documents.h"
 #include "velhost/profile.h"
 #include "velhost/rx.h"
@@ -101,6 +103,28 @@ TEST_F(MetreModule, ScriptedEditorIsMirroredInTheStore)
     reread.path = bdr.path;
     ASSERT_TRUE(Read(reread));
     EXPECT_EQ(reread.FindByTreePath(added->treePath).article->groupKey, "PRJ_RES(EU1)") << "written again";
+}
+
+TEST_F(MetreModule, ConfigPageKeepsTheScheduleWhenTheChosenFileNoLongerReads)
+{
+    auto article = std::make_unique<CZodEVIArticle>();
+    article->code = "EU-001";
+    article->treePath = "Réseaux\\\\EU1\\\\Linéaire\\\\EU-001 - Tuyau";
+    bdr.AddArticle(std::move(article));
+    ASSERT_TRUE(Write(bdr));
+    ASSERT_TRUE(Read(bdr));
+    const std::size_t articles = bdr.Articles().size();
+    SetCurrentBdr(&bdr);
+    DlgChildCfgUser page;
+    // Picked while it read, cut short before the dialog confirmed.
+    page.m_strPath = dir.Write("Autre.xml", "<bordereau>\n<article code=\"A\"");
+    page.OnApply();
+    SetCurrentBdr(nullptr);
+    EXPECT_NE(output.str().find(kCfgUnreadableSchedule), std::string::npos) << output.str();
+    EXPECT_EQ(bdr.path, dir.File("VelaBordereau.xml"));
+    EXPECT_EQ(bdr.Articles().size(), articles);
+    EXPECT_EQ(page.m_strPath, bdr.path) << "the page shows the file in use";
+    EXPECT_TRUE(Write(bdr)) << output.str();
 }
 
 TEST_F(MetreModule, CurrencyAndEstimates)

@@ -10,6 +10,9 @@
 #include <gtest/gtest.h>
 
 #include <cstdlib>
+#include <filesystem>
+#include <functional>
+#include <utility>
 #include <sstream>
 
 namespace {
@@ -199,7 +202,7 @@ TEST_F(ScheduleEditor, ScriptThatQuitsOrFailsLeavesTheFile)
         const char* expected;
     } cases[] = {
         {"cancelled", "supprimer " + kRegard + "\nannuler\n", 1, ""},
-        {"no change", "fin\n", 1, "aucune modification"},
+        {"looked at only: closed normally", "fin\n", 0, "aucune modification"},
         {"input ends", "supprimer " + kRegard + "\n", 1, "saisie interrompue"},
         {"unknown article", "supprimer X\\\\Y - Z\nfin\n", 1, "ligne 1 du script : aucun article « X\\\\Y - Z »"},
         {"bad value", "champ unitPrice " + kTuyau + "\ndouze\nfin\n", 1, "ligne 2 du script : champ « unitPrice » : nombre"},
@@ -261,6 +264,80 @@ TEST_F(ScheduleEditor, TerminalEditorThatFailsChangesNothing)
     unsetenv("VISUAL");
     EXPECT_NE(out.str().find("s'est terminé en erreur"), std::string::npos) << out.str();
     EXPECT_EQ(dir.Read("VelaBordereau.xml"), original);
+}
+
+// A scripted session during which another user saves the schedule.
+class InterruptedScript : public VelScriptedUI {
+public:
+    using VelScriptedUI::VelScriptedUI;
+    std::function<void()> meanwhile;
+
+protected:
+    std::optional<VelInputLine> readRawLine(const std::string& prompt) override
+    {
+        if (meanwhile)
+            std::exchange(meanwhile, nullptr)();
+        return VelScriptedUI::readRawLine(prompt);
+    }
+};
+
+TEST_F(ScheduleEditor, FileSavedByAnotherUserDuringTheSessionIsNotLost)
+{
+    // The other user prices the pipe at 7; the session prices the manhole at 99.
+    const std::string theirs = [&] {
+        std::string text = original;
+        text.replace(text.find("unitPrice=\"12.5\""), 16, "unitPrice=\"7\"");
+        return text;
+    }();
+    const std::string editor = dir.Write("editor.sh", "#!/bin/sh\n"
+                                                      "sed -i '0,/unitPrice=\"12.5\"/s//unitPrice=\"7\"/' '" +
+                                                          path + "'\nsed -i ':a;N;$!ba;s/unitPrice = 12.5/unitPrice = 99/2' \"$2\"\n");
+    std::filesystem::permissions(editor, std::filesystem::perms::owner_all);
+    struct Case {
+        const char* name;
+        const char* answer;  // null: a script
+        int status;
+        double pipe, manhole;
+    } cases[] = {
+        {"script", nullptr, 3, 7, 12.5},
+        {"the session's changes made on the newer version", "Oui\n", 0, 7, 99},
+        {"replaced", "Non\n", 0, 12.5, 99},
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.name);
+        dir.Write("VelaBordereau.xml", original);
+        output.str("");
+        int status = 0;
+        if (c.answer == nullptr) {
+            std::istringstream script("champ unitPrice " + kRegard + "\n99\nfin\n");
+            InterruptedScript ui(script, output, "edit.scr");
+            ui.meanwhile = [&] { dir.Write("VelaBordereau.xml", theirs); };
+            VelUserInterface* previous = velSetUI(&ui);
+            status = metre::EditScheduleFile(path, "", &records, &actions);
+            velSetUI(previous);
+        } else {
+            setenv("VISUAL", editor.c_str(), 1);
+            std::istringstream in(c.answer);
+            VelTerminalUI ui(in, output, false);
+            VelUserInterface* previous = velSetUI(&ui);
+            status = metre::EditScheduleFile(path, "", &records, &actions);
+            velSetUI(previous);
+            unsetenv("VISUAL");
+        }
+        EXPECT_EQ(status, c.status) << output.str();
+        EXPECT_NE(output.str().find("modifié par un autre utilisateur ou programme pendant la saisie"),
+                  std::string::npos)
+            << output.str();
+        ArticleVector now;
+        ASSERT_TRUE(metre::ReadScheduleFile(path, now));
+        ASSERT_EQ(now.size(), 2u);
+        EXPECT_EQ(now[0]->unitPrice, c.pipe);
+        EXPECT_EQ(now[1]->unitPrice, c.manhole);
+        if (c.status == 0) {
+            ASSERT_FALSE(records.empty());
+            EXPECT_EQ(records.back()->unitPrice, 99) << "the caller mirrors the article as written";
+        }
+    }
 }
 
 } // namespace

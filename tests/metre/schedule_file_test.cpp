@@ -313,14 +313,16 @@ TEST(ScheduleFile, WriteThatFailsMidwayLeavesFileAndBackup)
     std::signal(SIGXFSZ, previousHandler);
 
     EXPECT_FALSE(result);
-    EXPECT_NE(result.message.find("écriture interrompue"), std::string::npos) << result.message;
+    EXPECT_NE(result.message.find("non enregistré : fichier trop gros pour ce disque (pendant l'écriture)"),
+              std::string::npos)
+        << result.message;
     EXPECT_NE(result.message.find(path), std::string::npos);
     EXPECT_EQ(dir.Read("b.xml"), file);
     EXPECT_EQ(dir.Read("b.xml.bak"), backup);
     std::size_t entries = 0;
     for ([[maybe_unused]] const auto& entry : std::filesystem::directory_iterator(dir.path))
         ++entries;
-    EXPECT_EQ(entries, 2u) << "no temporary file is left behind";
+    EXPECT_EQ(entries, 3u) << "the file, its backup and its lock; no temporary file is left behind";
 }
 
 TEST(ScheduleFile, WriteIntoMissingFolderFailsCleanly)

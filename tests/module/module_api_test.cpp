@@ -6,10 +6,13 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <fstream>
+#include <sstream>
 #include <functional>
 #include <filesystem>
 #include <limits>
 
+#include "../host/file_faults.hpp"
 #include "../host/host_fixture.hpp"
 #include "../host/temp_dir.hpp"
 #include "velhost/profile.h"
@@ -49,9 +52,41 @@ protected:
                                                                        &none, &none, &bounds);
     }
 
+    // Loads the module again, so that it reads the schedule file as it is now.
+    void Reload()
+    {
+        velUnloadAllModules();
+        ASSERT_TRUE(acrxLoadModule((fs::path(VEL_MODULE_DIR) / kZodEVIModuleFile).c_str(), false));
+    }
+    std::string SchedulePath() const { return dir.File("profil/Donnees/VelaBordereau.xml"); }
+    std::string Schedule() const { return dir.Read("profil/Donnees/VelaBordereau.xml"); }
+    // Another user's version: the same schedule with one price changed.
+    void ChangePriceOnDisk(const std::string& from, const std::string& to)
+    {
+        std::string text = Schedule();
+        const std::size_t at = text.find("unitPrice=\"" + from + "\"");
+        ASSERT_NE(at, std::string::npos);
+        text.replace(at, from.size() + 12, "unitPrice=\"" + to + "\"");
+        dir.Write("profil/Donnees/VelaBordereau.xml", text);
+    }
+
     TempDir dir;
     VelHostSettings saved;
     ScriptedSession session;
+};
+
+// The user's answers, on a terminal rather than in a script.
+class TerminalAnswers {
+public:
+    explicit TerminalAnswers(const std::string& answers) : input(answers), ui(input, output, false)
+    {
+        previous = velSetUI(&ui);
+    }
+    ~TerminalAnswers() { velSetUI(previous); }
+    std::istringstream input;
+    std::ostringstream output;
+    VelTerminalUI ui;
+    VelUserInterface* previous = nullptr;
 };
 
 TEST_F(ModuleApi, PricesThroughUpdateSetWriteAndRead)
@@ -123,7 +158,7 @@ TEST_F(ModuleApi, BadArgumentsAnswerAStatusAndChangeNothing)
     const double infinite = std::numeric_limits<double>::infinity();
     const std::int32_t outOfRange = 13;
     const std::int32_t negative = -1;
-    CZodEVIStringMap prices;
+    CZodEVIStringMap prices{{"EP", "10"}};
     struct Case {
         const char* name;
         std::int32_t status;
@@ -166,6 +201,7 @@ TEST_F(ModuleApi, BadArgumentsAnswerAStatusAndChangeNothing)
         SCOPED_TRACE(c.name);
         EXPECT_EQ(c.status, kZodEVINotFound);
     }
+    EXPECT_TRUE(prices.empty()) << "a refused query leaves no stale price behind";
     // Nothing above touched the price.
     EXPECT_EQ(getPrice(&selector, &item, &price, "EP"), kZodEVIOk);
     EXPECT_EQ(price, 10.0);
@@ -228,6 +264,168 @@ TEST_F(ModuleApi, ShowPriceSaysWhenNoArticleCountsTheItem)
     EXPECT_EQ(show(&selector, &item, "EU 1"), kZodEVIFailed);
     EXPECT_NE(session.Output().find("ERREUR : aucun article ne se réfère à l'élément !"), std::string::npos)
         << session.Output();
+}
+
+TEST_F(ModuleApi, UnreadableScheduleIsNeverWrittenOver)
+{
+    auto* write = Function<ZodEVI_WriteBdrFn>("ZodEVI_WriteBdr");
+    auto* show = Function<ZodEVI_ShowBdrPriceFn>("ZodEVI_ShowBdrPrice");
+    ASSERT_EQ(UpdateNetwork(0, "EP", {"PVC 200"}), kZodEVIOk);
+    ASSERT_EQ(write(), kZodEVIOk);
+    const std::string whole = Schedule();
+    const std::string cut = whole.substr(0, whole.size() / 2);
+    dir.Write("profil/Donnees/VelaBordereau.xml", cut);
+    Reload();
+    session.ClearOutput();
+
+    // Updates still run in memory; nothing reaches the file, each time with the reason.
+    EXPECT_EQ(UpdateNetwork(0, "EP", {"Fonte 150"}), kZodEVIOk);
+    const std::int32_t selector = kZodEVIPipeLength;
+    const std::string item = "Fonte 150";
+    for (int attempt = 0; attempt < 2; ++attempt) {
+        EXPECT_EQ(write(), kZodEVIFailed);
+        EXPECT_EQ(show(&selector, &item, "EP"), kZodEVIFailed);
+    }
+    EXPECT_EQ(Schedule(), cut);
+    EXPECT_FALSE(fs::exists(SchedulePath() + ".bak"));
+    const std::string refusal = "ERREUR : le bordereau « " + SchedulePath() +
+                                " » n'a pas pu être lu (contenu refusé par le module de métré : fichier tronqué, "
+                                "mal formé ou champ inconnu) ; il n'est ni ouvert ni enregistré";
+    EXPECT_NE(session.Output().find(refusal), std::string::npos) << session.Output();
+
+    // Repaired, it is read again at the next write, which makes the update on it.
+    dir.Write("profil/Donnees/VelaBordereau.xml", whole);
+    EXPECT_EQ(write(), kZodEVIOk) << session.Output();
+    const std::string now = Schedule();
+    EXPECT_NE(now.find("PVC 200"), std::string::npos);
+    EXPECT_NE(now.find("Fonte 150"), std::string::npos);
+}
+
+TEST_F(ModuleApi, ScheduleChangedByAnotherUserIsNotOverwrittenSilently)
+{
+    auto* write = Function<ZodEVI_WriteBdrFn>("ZodEVI_WriteBdr");
+    auto* read = Function<ZodEVI_ReadBdrFn>("ZodEVI_ReadBdr");
+    auto* setPrice = Function<ZodEVI_SetBdrPriceFn>("ZodEVI_SetBdrPrice");
+    auto* getPrice = Function<ZodEVI_GetBdrPriceFn>("ZodEVI_GetBdrPrice");
+    const std::int32_t selector = kZodEVIPipeLength;
+    const std::string pvc = "PVC 200", cast = "Fonte 150";
+    struct Case {
+        const char* name;
+        const char* answers;  // null: a script
+        std::int32_t status;
+        bool theirsKept;
+    } cases[] = {
+        {"script", nullptr, kZodEVIFailed, true},
+        {"read again and make the change on it", "Oui\n", kZodEVIOk, true},
+        {"replace it", "Non\n", kZodEVIOk, false},
+        {"cancelled", "", kZodEVIFailed, true},
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.name);
+        fs::remove(SchedulePath());
+        ASSERT_EQ(read(), kZodEVIFailed) << "no file yet";
+        ASSERT_EQ(UpdateNetwork(0, "EP", {"PVC 200", "Fonte 150"}), kZodEVIOk);
+        ASSERT_EQ(write(), kZodEVIOk);
+        ChangePriceOnDisk("0", "77");  // the first price of the file: another user's work
+        const std::string theirs = Schedule();
+        const double mine = 31.5;
+        ASSERT_EQ(setPrice(&selector, &pvc, &mine, "EP"), kZodEVIOk);
+        session.ClearOutput();
+        std::int32_t status = 0;
+        std::string shown;
+        if (c.answers == nullptr) {
+            status = write();
+            shown = session.Output();
+        } else {
+            TerminalAnswers user(c.answers);
+            status = write();
+            shown = user.output.str();
+        }
+        EXPECT_EQ(status, c.status) << shown;
+        EXPECT_NE(shown.find("« " + SchedulePath() + " » a été modifié par un autre utilisateur ou programme"),
+                  std::string::npos)
+            << shown;
+        if (c.status != kZodEVIOk) {
+            EXPECT_EQ(Schedule(), theirs);
+            continue;
+        }
+        ASSERT_EQ(read(), kZodEVIOk);
+        double price = 0;
+        EXPECT_EQ(getPrice(&selector, &pvc, &price, "EP"), kZodEVIOk);
+        EXPECT_EQ(price, 31.5);
+        EXPECT_EQ(Schedule().find("unitPrice=\"77\"") != std::string::npos, c.theirsKept);
+        EXPECT_EQ(getPrice(&selector, &cast, &price, "EP"), kZodEVIOk);
+    }
+}
+
+TEST_F(ModuleApi, ScheduleWriteThatFailsAnywhereLeavesThePreviousFile)
+{
+    auto* write = Function<ZodEVI_WriteBdrFn>("ZodEVI_WriteBdr");
+    auto* read = Function<ZodEVI_ReadBdrFn>("ZodEVI_ReadBdr");
+    auto* setPrice = Function<ZodEVI_SetBdrPriceFn>("ZodEVI_SetBdrPrice");
+    ASSERT_EQ(UpdateNetwork(0, "EP", {"PVC 200"}), kZodEVIOk);
+    ASSERT_EQ(write(), kZodEVIOk);
+    ASSERT_EQ(write(), kZodEVIOk);
+    const std::string previous = Schedule(), backup = dir.Read("profil/Donnees/VelaBordereau.xml.bak");
+    const std::int32_t selector = kZodEVIPipeLength;
+    const std::string pvc = "PVC 200";
+    const double price = 12.25;
+    std::int32_t status = 0;
+    const int calls = ForEveryFailingCall(
+        [&] {
+            dir.Write("profil/Donnees/VelaBordereau.xml", previous);
+            dir.Write("profil/Donnees/VelaBordereau.xml.bak", backup);
+            ASSERT_EQ(read(), kZodEVIOk);
+            ASSERT_EQ(setPrice(&selector, &pvc, &price, "EP"), kZodEVIOk);
+            session.ClearOutput();
+        },
+        [&] { status = write(); },
+        [&](const FaultRun& run) {
+            SCOPED_TRACE(run.failed + " n° " + std::to_string(run.calls));
+            if (run.committed) {
+                EXPECT_EQ(status, kZodEVIOk);
+                EXPECT_NE(Schedule().find("unitPrice=\"12.25\""), std::string::npos);
+                return;
+            }
+            EXPECT_EQ(status, kZodEVIFailed);
+            EXPECT_EQ(Schedule(), previous);
+            const std::string b = dir.Read("profil/Donnees/VelaBordereau.xml.bak");
+            EXPECT_EQ(b, backup);
+            EXPECT_NE(session.Output().find("Fichier « " + SchedulePath() + " » non enregistré : " +
+                                            velFileErrorReason(FileFaults::ErrorOf(run.failed))),
+                      std::string::npos)
+                << session.Output();
+            EXPECT_NE(session.Output().find("Le fichier précédent est conservé tel quel"), std::string::npos);
+        });
+    EXPECT_GT(calls, 10);
+    std::size_t entries = 0;
+    for ([[maybe_unused]] const auto& entry : fs::directory_iterator(dir.File("profil/Donnees")))
+        ++entries;
+    EXPECT_EQ(entries, 3u) << "the schedule, its backup and its lock";
+}
+
+TEST_F(ModuleApi, ShowPriceAnswersOkWhenTheEditorClosesNormally)
+{
+    auto* show = Function<ZodEVI_ShowBdrPriceFn>("ZodEVI_ShowBdrPrice");
+    auto* write = Function<ZodEVI_WriteBdrFn>("ZodEVI_WriteBdr");
+    ASSERT_EQ(UpdateNetwork(0, "EP", {"PVC 200"}), kZodEVIOk);
+    ASSERT_EQ(write(), kZodEVIOk);
+    const std::int32_t selector = kZodEVIPipeLength;
+    const std::string pvc = "PVC 200";
+    struct Case {
+        const char* name;
+        const char* script;
+        std::int32_t status;
+    } cases[] = {
+        {"only looked", "fin\n", kZodEVIOk},
+        {"cancelled", "annuler\n", kZodEVIFailed},
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.name);
+        session.input.clear();
+        session.input.str(c.script);
+        EXPECT_EQ(show(&selector, &pvc, "EP"), c.status) << session.Output();
+    }
 }
 
 TEST_F(ModuleApi, ServiceAndCommandsGoWithTheModule)

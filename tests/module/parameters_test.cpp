@@ -73,7 +73,8 @@ TEST_F(Parameters, WriteErrorReportedOncePerFile)
         const char* shown; // null: no message
     };
     const Step steps[] = {
-        {missing.c_str(), "Fichier de paramètres inexistant !\n(Code d'erreur 2)"},
+        {missing.c_str(), "Fichier de paramètres inexistant !\n(Code d'erreur 2)\ndossier introuvable : vérifiez le "
+                          "chemin du fichier."},
         {missing.c_str(), nullptr},
         {folder.c_str(), "Sauvegarde des paramètres imposssible !"},
         {"", "Pas de nom pour le fichier de paramètres !\n(Code d'erreur 22)"},

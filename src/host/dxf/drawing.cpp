@@ -1,6 +1,6 @@
-// Reading a whole DXF drawing (one pass over the mapped file that cuts it into records,
-// then the header, the handle index and the dictionaries) and writing it back, copying
-// the bytes of everything that did not change.
+// Reading a whole DXF drawing (one pass over the file read into memory that cuts it into
+// records, then the header, the handle index and the dictionaries) and writing it back,
+// copying the bytes of everything that did not change.
 #include "host/dxf/drawing.hpp"
 
 #include <fcntl.h>
@@ -116,11 +116,11 @@ private:
 
 Source::~Source()
 {
-    if (mapping_)
-        munmap(mapping_, size_);
+    if (buffer_ != nullptr)
+        munmap(buffer_, capacity_);
 }
 
-bool Source::Map(const std::string& path, std::string& error)
+bool Source::Load(const std::string& path, std::string& error)
 {
     const int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC);
     if (fd < 0) {
@@ -133,24 +133,50 @@ bool Source::Map(const std::string& path, std::string& error)
         close(fd);
         return false;
     }
-    if (st.st_size == 0) {
+    const auto fail = [&](int err) {
+        error = FormatString("« %s » : lecture impossible (%s)", path.c_str(), std::strerror(err));
         close(fd);
-        Own(std::string());
-        return true;
-    }
-    void* p = mmap(nullptr, static_cast<std::size_t>(st.st_size), PROT_READ, MAP_PRIVATE, fd, 0);
-    const int mapErrno = errno;
-    close(fd);
-    if (p == MAP_FAILED) {
-        error = FormatString("« %s » : lecture impossible (%s)", path.c_str(), std::strerror(mapErrno));
         return false;
+    };
+    // Memory of its own rather than the heap: in large pages where the system has them,
+    // filling it costs no more than mapping the file did.
+    std::size_t capacity = static_cast<std::size_t>(st.st_size) + 1;
+    void* buffer = mmap(nullptr, capacity, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+    if (buffer == MAP_FAILED)
+        return fail(errno);
+    madvise(buffer, capacity, MADV_HUGEPAGE);
+    // One read of the size announced; a file that grows meanwhile is read to its end, one
+    // that shrinks is what is left of it.
+    std::size_t size = 0;
+    for (;;) {
+        if (size == capacity) {
+            void* larger = mremap(buffer, capacity, capacity * 2, MREMAP_MAYMOVE);
+            if (larger == MAP_FAILED) {
+                munmap(buffer, capacity);
+                return fail(errno);
+            }
+            buffer = larger;
+            capacity *= 2;
+        }
+        const ssize_t n = read(fd, static_cast<char*>(buffer) + size, capacity - size);
+        if (n < 0 && errno == EINTR)
+            continue;
+        if (n < 0) {
+            const int err = errno;
+            munmap(buffer, capacity);
+            return fail(err);
+        }
+        if (n == 0)
+            break;
+        size += static_cast<std::size_t>(n);
     }
-    // One pass from start to end: read ahead, and drop pages behind.
-    madvise(p, static_cast<std::size_t>(st.st_size), MADV_SEQUENTIAL);
-    madvise(p, static_cast<std::size_t>(st.st_size), MADV_WILLNEED);
-    mapping_ = p;
-    data_ = static_cast<const char*>(p);
-    size_ = static_cast<std::size_t>(st.st_size);
+    close(fd);
+    if (buffer_ != nullptr)
+        munmap(buffer_, capacity_);
+    buffer_ = buffer;
+    capacity_ = capacity;
+    data_ = static_cast<const char*>(buffer);
+    size_ = size;
     return true;
 }
 

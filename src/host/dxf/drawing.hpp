@@ -1,5 +1,5 @@
 // The top layer of the DXF reader and writer: a whole drawing as the list of its
-// records (every 0-tag object, in file order) over the mapped file, with the header
+// records (every 0-tag object, in file order) over the file read into memory, with the header
 // settings, the handle index and the objects the host has opened so far.
 #pragma once
 
@@ -24,13 +24,17 @@ public:
     ~Source();
     Source(const Source&) = delete;
     Source& operator=(const Source&) = delete;
-    bool Map(const std::string& path, std::string& error);
+    // Reads the whole file into memory: a mapping of the file would fault on every page
+    // that another program cut off it while it is open, and the writer copies from it at
+    // save.
+    bool Load(const std::string& path, std::string& error);
     void Own(std::string content);
     std::string_view view() const { return {data_, size_}; }
 
 private:
     std::string owned_;
-    void* mapping_ = nullptr;
+    void* buffer_ = nullptr;
+    std::size_t capacity_ = 0;
     const char* data_ = "";
     std::size_t size_ = 0;
 };

@@ -7,6 +7,7 @@
 
 #include "text/text.hpp"
 #include "velhost/editor.h"
+#include "velhost/files.h"
 #include "velhost/profile.h"
 #include "velhost/ui.h"
 
@@ -92,14 +93,20 @@ void ReportParameterError(const char* file)
     if (EqualsNoCase(name, LastFile()))
         return;
     std::error_code ec;
+    // The code says little to a user: the reason and what to do follow it.
+    const std::string why = code != 0 && code != EINVAL
+                                ? "\n" + velFileErrorReason(code) + " : " + velFileErrorAdvice(code) + "."
+                                : std::string();
     if (file == nullptr)
-        MessageBoxText(nullptr, "Pointeur nul pour le fichier de paramètres !\n(Code d'erreur %d)", code);
+        MessageBoxText(nullptr, "Pointeur nul pour le fichier de paramètres !\n(Code d'erreur %d)%s", code, why.c_str());
     else if (name.empty())
-        MessageBoxText(nullptr, "Pas de nom pour le fichier de paramètres !\n(Code d'erreur %d)", code);
+        MessageBoxText(nullptr, "Pas de nom pour le fichier de paramètres !\n(Code d'erreur %d)%s", code, why.c_str());
     else if (std::filesystem::exists(name, ec))
-        MessageBoxText(nullptr, "%s :\nSauvegarde des paramètres imposssible !\n(Code d'erreur %d)", name.c_str(), code);
+        MessageBoxText(nullptr, "%s :\nSauvegarde des paramètres imposssible !\n(Code d'erreur %d)%s", name.c_str(),
+                       code, why.c_str());
     else
-        MessageBoxText(nullptr, "%s :\nFichier de paramètres inexistant !\n(Code d'erreur %d)", name.c_str(), code);
+        MessageBoxText(nullptr, "%s :\nFichier de paramètres inexistant !\n(Code d'erreur %d)%s", name.c_str(), code,
+                       why.c_str());
     LastFile() = name;
 }
 

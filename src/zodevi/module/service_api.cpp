@@ -32,6 +32,17 @@ std::int32_t PriceStatus(bool found)
     return found ? kZodEVIOk : kZodEVINotFound;
 }
 
+// Applies a change to the current schedule and, when it changed something, keeps it to
+// be made again if the file must be read anew before it is written.
+template <class Change>
+std::int32_t Apply(Change change)
+{
+    if (!change(*g_current))
+        return kZodEVIFailed;
+    RecordPendingChange(*g_current, [change](CZodEVIBdr& bdr) { change(bdr); });
+    return kZodEVIOk;
+}
+
 // Values that cannot name a depth, thickness or price ("nan", "inf") are dropped rather
 // than written into codes and texts.
 CZodEVIRealArray FiniteValues(const CZodEVIRealArray& values)
@@ -78,22 +89,25 @@ ZODEVI_EXPORT std::int32_t ZodEVI_UpdateBdrRsx(const std::int32_t* networkIndex,
         return kZodEVIFailed;
     // Only the low 16 bits choose the texts of the templates.
     const int index = static_cast<int>(static_cast<std::uint16_t>(*networkIndex));
-    return Status(UpdateNetwork(*g_current, index, *networkName, *models, *pipeSupplies, *fittings,
-                                *fittingSupplies, *ducts, *materials, FiniteValues(*depthBounds)));
+    return Apply([index, name = *networkName, models = *models, pipeSupplies = *pipeSupplies, fittings = *fittings,
+                  fittingSupplies = *fittingSupplies, ducts = *ducts, materials = *materials,
+                  bounds = FiniteValues(*depthBounds)](CZodEVIBdr& bdr) {
+        return UpdateNetwork(bdr, index, name, models, pipeSupplies, fittings, fittingSupplies, ducts, materials, bounds);
+    });
 }
 
 ZODEVI_EXPORT std::int32_t ZodEVI_UpdateBdrTnePf(const CZodEVIRealArray* depthBounds)
 {
     if (g_current == nullptr || depthBounds == nullptr)
         return kZodEVIFailed;
-    return Status(UpdateDepthClasses(*g_current, FiniteValues(*depthBounds)));
+    return Apply([bounds = FiniteValues(*depthBounds)](CZodEVIBdr& bdr) { return UpdateDepthClasses(bdr, bounds); });
 }
 
 ZODEVI_EXPORT std::int32_t ZodEVI_UpdateBdrPgn(const CZodEVIStringList* models)
 {
     if (g_current == nullptr || models == nullptr)
         return kZodEVIFailed;
-    return Status(UpdateCombDucts(*g_current, *models));
+    return Apply([models = *models](CZodEVIBdr& bdr) { return UpdateCombDucts(bdr, models); });
 }
 
 ZODEVI_EXPORT std::int32_t ZodEVI_UpdateBdrMat(const CZodEVIStringList* volumeMaterials,
@@ -102,28 +116,29 @@ ZODEVI_EXPORT std::int32_t ZodEVI_UpdateBdrMat(const CZodEVIStringList* volumeMa
 {
     if (g_current == nullptr || volumeMaterials == nullptr || surfaceMaterials == nullptr || lengthMaterials == nullptr)
         return kZodEVIFailed;
-    return Status(UpdateMaterials(*g_current, *volumeMaterials, *surfaceMaterials, *lengthMaterials));
+    return Apply([volumes = *volumeMaterials, surfaces = *surfaceMaterials,
+                  lengths = *lengthMaterials](CZodEVIBdr& bdr) { return UpdateMaterials(bdr, volumes, surfaces, lengths); });
 }
 
 ZODEVI_EXPORT std::int32_t ZodEVI_UpdateBdrEpDcp(const CZodEVIRealArray* thicknesses)
 {
     if (g_current == nullptr || thicknesses == nullptr)
         return kZodEVIFailed;
-    return Status(UpdateStripping(*g_current, FiniteValues(*thicknesses)));
+    return Apply([values = FiniteValues(*thicknesses)](CZodEVIBdr& bdr) { return UpdateStripping(bdr, values); });
 }
 
 ZODEVI_EXPORT std::int32_t ZodEVI_UpdateBdrEpVeg(const CZodEVIRealArray* thicknesses)
 {
     if (g_current == nullptr || thicknesses == nullptr)
         return kZodEVIFailed;
-    return Status(UpdateVegetation(*g_current, FiniteValues(*thicknesses)));
+    return Apply([values = FiniteValues(*thicknesses)](CZodEVIBdr& bdr) { return UpdateVegetation(bdr, values); });
 }
 
 ZODEVI_EXPORT std::int32_t ZodEVI_UpdateBdrEpRbt(const CZodEVIRealArray* classLimits)
 {
     if (g_current == nullptr || classLimits == nullptr)
         return kZodEVIFailed;
-    return Status(UpdatePlaning(*g_current, FiniteValues(*classLimits)));
+    return Apply([limits = FiniteValues(*classLimits)](CZodEVIBdr& bdr) { return UpdatePlaning(bdr, limits); });
 }
 
 ZODEVI_EXPORT std::int32_t ZodEVI_GetBdrPrice(const std::int32_t* selector, const std::string* itemName,
@@ -139,6 +154,9 @@ ZODEVI_EXPORT std::int32_t ZodEVI_GetBdrPrice(const std::int32_t* selector, cons
 ZODEVI_EXPORT std::int32_t ZodEVI_GetBdrPriceRsx(const std::int32_t* selector, const std::string* itemName,
                                                  CZodEVIStringMap* prices)
 {
+    // Every answer leaves the map with this query's prices only.
+    if (prices != nullptr)
+        prices->clear();
     if (g_current == nullptr || !KnownSelector(selector) || itemName == nullptr || prices == nullptr)
         return kZodEVINotFound;
     return PriceStatus(GetPricesPerNetwork(*g_current, *selector, *itemName, *prices));
@@ -151,7 +169,9 @@ ZODEVI_EXPORT std::int32_t ZodEVI_SetBdrPrice(const std::int32_t* selector, cons
     if (g_current == nullptr || !KnownSelector(selector) || itemName == nullptr || price == nullptr ||
         !std::isfinite(*price))
         return kZodEVIFailed;
-    return Status(SetPrice(*g_current, *selector, *itemName, *price, networkName));
+    return Apply([selector = *selector, item = *itemName, value = *price, networkName](CZodEVIBdr& bdr) {
+        return SetPrice(bdr, selector, item, value, networkName);
+    });
 }
 
 ZODEVI_EXPORT std::int32_t ZodEVI_ShowBdrPrice(const std::int32_t* selector, const std::string* itemName,

@@ -5,9 +5,12 @@
 #include "module/parameters.hpp"
 #include "module/siblings.hpp"
 #include "text/text.hpp"
+#include "velhost/editor.h"
+#include "velhost/files.h"
 #include "velhost/ui.h"
 
 #include <algorithm>
+#include <filesystem>
 #include <memory>
 
 namespace {
@@ -107,6 +110,129 @@ bool Export(CZodEVIBdr& bdr)
     return CallMetre<VtMetre_ExporterXmlFn>("VtMetre_ExporterXml", std::string(bdr.path), &list, 1) == 0;
 }
 
+bool SameFile(const std::string& a, const std::string& b)
+{
+    if (a == b)
+        return true;
+    std::error_code error;
+    return std::filesystem::equivalent(a, b, error);
+}
+
+// Why an existing file did not read, as far as this side can tell; the metre module has
+// printed the details (line, element) when it refused the content.
+std::string NotReadReason(const VelFileIdentity& file)
+{
+    if (!file.readable)
+        return "fichier illisible : droits ou disque";
+    if (file.size == 0)
+        return "fichier vide";
+    return "contenu refusé par le module de métré : fichier tronqué, mal formé ou champ inconnu";
+}
+
+void NoteFailedRead(CZodEVIBdr& bdr, const std::string& path, const VelFileIdentity& before)
+{
+    CZodEVIBdrFileState& state = bdr.fileState;
+    state.path = path;
+    state.known = true;
+    state.identity = before;
+    // A missing file is no loss: the first write creates it.
+    state.notRead = before.exists;
+    state.notReadReason = before.exists ? NotReadReason(before) : std::string();
+}
+
+void PrintNotRead(const CZodEVIBdr& bdr)
+{
+    const std::string& path = bdr.fileState.path;
+    acutPrintf("\nERREUR : le bordereau « %s » n'a pas pu être lu (%s) ; il n'est ni ouvert ni enregistré tant "
+               "qu'il ne se lit pas, pour ne pas perdre les prix qu'il contient. Réparez-le ou remettez sa copie "
+               "« %s.bak », ou choisissez un autre bordereau ; les changements faits depuis restent en mémoire.\n",
+               path.c_str(), bdr.fileState.notReadReason.c_str(), path.c_str());
+}
+
+// The metre module's articles of a file. `before` is the file's identity taken first:
+// a version written while the module reads is then seen as a change at the next write.
+bool ReadArticles(const std::string& path, ReturnedArticles& delivered, VelFileIdentity& before)
+{
+    before = velFileIdentity(path);
+    return CallMetre<VtMetre_RemplitTableauFn>("VtMetre_RemplitTableau", std::string(path), &delivered.list, 1) == 0;
+}
+
+void AddProjectWideArticles(CZodEVIBdr& bdr);
+
+// Replaces the content of the schedule with what was read; the changes made in memory
+// are forgotten, the file now being their reference.
+void Fill(CZodEVIBdr& bdr, const std::string& path, ReturnedArticles& delivered, const VelFileIdentity& before)
+{
+    bdr.Clear();
+    bdr.path = path;
+    CZodEVIGroup* group = nullptr;
+    const std::string* groupKey = nullptr;
+    for (CZodEVIArticle*& raw : delivered.list) {
+        if (raw == nullptr)
+            continue;
+        CZodEVIArticle* article = bdr.AddArticle(std::unique_ptr<CZodEVIArticle>(raw));
+        raw = nullptr;
+        // Files keep a group's articles together: the previous article's group is usually
+        // the one.
+        if (groupKey == nullptr || *groupKey != article->groupKey)
+            group = bdr.GroupOf(article->groupKey, true);
+        groupKey = &article->groupKey;
+        group->push_back(article);
+    }
+    AddProjectWideArticles(bdr);
+    bdr.fileState = CZodEVIBdrFileState{path, true, before, false, {}, {}};
+}
+
+// Reads the file again and makes the changes of memory on it; on failure the schedule
+// keeps its content and its changes.
+bool Reload(CZodEVIBdr& bdr)
+{
+    ReturnedArticles delivered;
+    VelFileIdentity before;
+    if (!ReadArticles(bdr.path, delivered, before)) {
+        NoteFailedRead(bdr, bdr.path, before);
+        return false;
+    }
+    auto pending = std::move(bdr.fileState.pending);
+    Fill(bdr, bdr.path, delivered, before);
+    for (const auto& change : pending)
+        change(bdr);
+    bdr.fileState.pending = std::move(pending);
+    return true;
+}
+
+// A schedule whose file did not read tries once more, so that a repaired file is taken
+// up; false, with the message, while it still does not read.
+bool FileReadable(CZodEVIBdr& bdr)
+{
+    // A file that went away meanwhile is no longer in danger: the next write creates one.
+    if (!bdr.fileState.notRead || !SameFile(bdr.fileState.path, bdr.path) || Reload(bdr) || !bdr.fileState.notRead)
+        return true;
+    PrintNotRead(bdr);
+    return false;
+}
+
+// True when the file is the version the schedule read or wrote last (or is missing, for
+// a schedule that never met it).
+bool FileUnchanged(const CZodEVIBdr& bdr, const VelFileIdentity& now)
+{
+    const CZodEVIBdrFileState& state = bdr.fileState;
+    if (!state.known || !SameFile(state.path, bdr.path))
+        return !now.exists;
+    return state.identity.sameContent(now);
+}
+
+// The file as it is now becomes the version the schedule stands on.
+void AdoptFile(CZodEVIBdr& bdr)
+{
+    CZodEVIBdrFileState& state = bdr.fileState;
+    state.path = bdr.path;
+    state.known = true;
+    state.identity = velFileIdentity(bdr.path);
+    state.notRead = false;
+    state.notReadReason.clear();
+}
+
 void AddProjectWideArticles(CZodEVIBdr& bdr)
 {
     const std::string roadKey = MakeRoadGroupKey();
@@ -154,38 +280,114 @@ std::string QuantityPatternOfSelector(int selector)
 bool Read(CZodEVIBdr& bdr)
 {
     bdr.Clear();
+    bdr.fileState.pending.clear();
     ReturnedArticles delivered;
-    if (CallMetre<VtMetre_RemplitTableauFn>("VtMetre_RemplitTableau", std::string(bdr.path), &delivered.list, 1) != 0)
+    VelFileIdentity before;
+    if (!ReadArticles(bdr.path, delivered, before)) {
+        NoteFailedRead(bdr, bdr.path, before);
         return false;
-    CZodEVIGroup* group = nullptr;
-    const std::string* groupKey = nullptr;
-    for (CZodEVIArticle*& raw : delivered.list) {
-        if (raw == nullptr)
-            continue;
-        CZodEVIArticle* article = bdr.AddArticle(std::unique_ptr<CZodEVIArticle>(raw));
-        raw = nullptr;
-        // Files keep a group's articles together: the previous article's group is usually
-        // the one.
-        if (groupKey == nullptr || *groupKey != article->groupKey)
-            group = bdr.GroupOf(article->groupKey, true);
-        groupKey = &article->groupKey;
-        group->push_back(article);
     }
-    AddProjectWideArticles(bdr);
+    Fill(bdr, bdr.path, delivered, before);
     return true;
+}
+
+bool ReadFrom(CZodEVIBdr& bdr, const std::string& path)
+{
+    ReturnedArticles delivered;
+    VelFileIdentity before;
+    if (!ReadArticles(path, delivered, before)) {
+        if (SameFile(path, bdr.path))
+            NoteFailedRead(bdr, path, before);
+        return false;
+    }
+    Fill(bdr, path, delivered, before);
+    return true;
+}
+
+void RecordPendingChange(CZodEVIBdr& bdr, std::function<void(CZodEVIBdr&)> change)
+{
+    bdr.fileState.pending.push_back(std::move(change));
 }
 
 bool Write(CZodEVIBdr& bdr)
 {
-    return Export(bdr);
+    // No file to compare with nor to lock: the metre module says why nothing is written.
+    if (bdr.path.empty())
+        return Export(bdr);
+    for (;;) {
+        if (!FileReadable(bdr))
+            return false;
+        VelFileIdentity now;
+        {
+            // Compared and replaced under the lock: another host cannot slip its version
+            // in between.
+            const VelFileLock lock(bdr.path);
+            if (!lock.locked()) {
+                acutPrintf("\n%s\n", lock.result().message.c_str());
+                return false;
+            }
+            now = velFileIdentity(bdr.path);
+            if (FileUnchanged(bdr, now)) {
+                if (!Export(bdr))
+                    return false;
+                AdoptFile(bdr);
+                bdr.fileState.pending.clear();
+                return true;
+            }
+        }
+        const bool neverRead = !bdr.fileState.known || !SameFile(bdr.fileState.path, bdr.path);
+        if (velUI().isScripted()) {
+            if (neverRead)
+                acutPrintf("\nERREUR : le bordereau « %s » existe mais n'a pas été lu ; il n'est pas remplacé. "
+                           "Lisez-le, puis recommencez.\n",
+                           bdr.path.c_str());
+            else
+                acutPrintf("\nERREUR : le bordereau « %s » a été modifié par un autre utilisateur ou programme "
+                           "depuis sa lecture ; il n'est pas remplacé, pour ne pas perdre ses modifications. "
+                           "Relisez-le, puis recommencez.\n",
+                           bdr.path.c_str());
+            return false;
+        }
+        acutPrintf(neverRead ? "\nLe bordereau « %s » existe mais n'a pas été lu."
+                             : "\nLe bordereau « %s » a été modifié par un autre utilisateur ou programme depuis "
+                               "sa lecture.",
+                   bdr.path.c_str());
+        bool reload = true;
+        if (!AskYesNo("Le relire et y reporter les changements faits ici (Non : le remplacer par la version en "
+                      "mémoire)",
+                      true, true, reload))
+            return false;
+        if (reload) {
+            if (!Reload(bdr)) {
+                if (bdr.fileState.notRead)
+                    PrintNotRead(bdr);
+                else
+                    acutPrintf("\nERREUR : le bordereau « %s » n'existe plus ; rien n'est enregistré. Le prochain "
+                               "enregistrement le recréera avec la version en mémoire.\n",
+                               bdr.path.c_str());
+                return false;
+            }
+        } else {
+            bdr.fileState.path = bdr.path;
+            bdr.fileState.known = true;
+            bdr.fileState.identity = now;
+        }
+    }
 }
 
 bool Edit(CZodEVIBdr& bdr, const std::string& treePath)
 {
+    if (!FileReadable(bdr))
+        return false;
+    // The editor works on the file; when that is the version of memory, the file it
+    // leaves becomes that version too.
+    const bool upToDate = FileUnchanged(bdr, velFileIdentity(bdr.path));
     ReturnedArticles records;
     std::vector<std::uint32_t> actions;
     if (CallEditor(bdr, treePath, records, actions) != 0)
         return false;
+    if (upToDate)
+        AdoptFile(bdr);
     if (ApplyChanges(bdr, records.list, actions))
         return Write(bdr);
     return true;
@@ -237,6 +439,8 @@ bool SetPrice(CZodEVIBdr& bdr, int selector, const std::string& item, double pri
 
 bool ShowPrice(CZodEVIBdr& bdr, int selector, const std::string& item, const std::string& networkName)
 {
+    if (!FileReadable(bdr))
+        return false;
     const std::string quantityKey = QuantityKeyOf(selector, item);
     std::vector<const CZodEVIGroup*> searched;
     if (selector == 0 || selector == 1 || selector == 6) {
@@ -259,11 +463,14 @@ bool ShowPrice(CZodEVIBdr& bdr, int selector, const std::string& item, const std
     bool shown = false;
     if (found != nullptr) {
         const std::string treePath = found->treePath;
+        const bool upToDate = FileUnchanged(bdr, velFileIdentity(bdr.path));
         shown = CallEditor(bdr, treePath, records, actions) == 0;
+        if (shown && upToDate)
+            AdoptFile(bdr);
     } else {
         MessageBoxFlags(nullptr, MB_OK | MB_ICONWARNING, "%s", kNoArticleMessage);
     }
     if (ApplyChanges(bdr, records.list, actions))
-        Export(bdr);
+        Write(bdr);
     return shown;
 }

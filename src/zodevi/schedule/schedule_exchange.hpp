@@ -6,6 +6,7 @@
 #include "schedule/schedule_store.hpp"
 
 #include <cstdint>
+#include <functional>
 #include <map>
 #include <string>
 #include <vector>
@@ -23,10 +24,19 @@ enum : std::uint32_t { kEditDeleted = 1, kEditModified = 2, kEditAdded = 3 };
 std::string QuantityPatternOfSelector(int selector);
 
 // Clears the store, then fills it from the file. On failure the store stays empty, even
-// when the metre module delivered part of the file first.
+// when the metre module delivered part of the file first; a file that exists but does
+// not read is then kept from every write (and the editor) until a read of it succeeds.
 bool Read(CZodEVIBdr& bdr);
-// Hands every article to the metre module, in schedule order.
+// Reads another file (or the same) and, only when it reads, makes it the schedule's file
+// and content; otherwise the schedule keeps its file and content.
+bool ReadFrom(CZodEVIBdr& bdr, const std::string& path);
+// Hands every article to the metre module, in schedule order, unless the file could not
+// be read or changed on disk since it was read or written here. A change is told on the
+// command line; a script stops there, a user chooses between reading the file again with
+// the changes made in memory (RecordPendingChange) made again on it, and replacing it.
 bool Write(CZodEVIBdr& bdr);
+// Remembers a change made in memory, to be made again on a newer version of the file.
+void RecordPendingChange(CZodEVIBdr& bdr, std::function<void(CZodEVIBdr&)> change);
 // Opens the editor (on the article with that tree path, or the whole schedule) and
 // mirrors its changes in the store; writes the file again when an added article took a
 // neighbour's group key. False when the editor did not close normally.

@@ -6,6 +6,7 @@
 #include "schedule/article.hpp"
 #include "schedule/article_group.hpp"
 #include "schedule/insertion_map.hpp"
+#include "schedule/schedule_file_state.hpp"
 
 #include <memory>
 #include <set>
@@ -113,6 +114,8 @@ public:
 
     std::string path;
     int nextNumber = 1;
+    // Kept by the exchange with the metre module; Clear leaves it alone.
+    CZodEVIBdrFileState fileState;
 
 private:
     void ForgetHighestNumber() { highestNumberKnown = false; }

@@ -70,10 +70,15 @@ void DlgChildCfgUser::OnApply()
     CZodEVIBdr* bdr = CurrentBdr();
     if (bdr == nullptr)
         return;
-    bdr->path = m_strPath;
-    if (Read(*bdr))
-        WriteParameter(MainServices()->GetParameterFile().c_str(), kBdrParameterSection, kBdrParameterKey,
-                       m_strPath.c_str());
+    // Read beside the current schedule first: a file that changed or vanished since it
+    // was picked must not leave the user with an empty schedule bound to it.
+    if (!ReadFrom(*bdr, m_strPath)) {
+        MessageBoxFlags(&velUI(), MB_ICONWARNING | MB_OK, "%s", kCfgUnreadableSchedule);
+        m_strPath = bdr->path;
+        return;
+    }
+    WriteParameter(MainServices()->GetParameterFile().c_str(), kBdrParameterSection, kBdrParameterKey,
+                   m_strPath.c_str());
 }
 
 ZODEVI_EXPORT void Vel_ZodEVI_CfgUser(CVelConfigPage** page, void* /*parent*/)

@@ -15,7 +15,8 @@ public:
 
     // Asks for a file; keeps it when it can be read as a price schedule.
     void OnBrowse();
-    // Makes the chosen file the current schedule's and remembers it.
+    // Makes the chosen file the current schedule's and remembers it, once it has read; a
+    // file that does not read leaves the current schedule and its file as they were.
     void OnApply();
 
     std::string m_strPath;

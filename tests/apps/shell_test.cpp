@@ -3,8 +3,8 @@
 
 #include <gtest/gtest.h>
 
-#include "../host/host_fixture.hpp"
-#include "../host/temp_dir.hpp"
+#include "support/session.hpp"
+#include "support/temp_dir.hpp"
 #include "velhost/documents.h"
 #include "velhost/profile.h"
 

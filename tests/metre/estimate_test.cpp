@@ -5,12 +5,15 @@
 #include "metre_services.hpp"
 
 #include "../host/file_faults.hpp"
-#include "../host/temp_dir.hpp"
+#include "support/drawing.hpp"
+#include "support/temp_dir.hpp"
 #include "velhost/dbase.h"
 #include "velhost/documents.h"
 #include "velhost/ui.h"
 
 #include <gtest/gtest.h>
+
+#include "support/session.hpp"
 
 #include <cstdlib>
 #include <sstream>
@@ -21,40 +24,10 @@ using metre::ArticleVector;
 
 // A project record as the sibling modules write it: marker, name, then key/quantity pairs.
 void AddProject(AcDbDatabase& db, const char* first, const char* second, const std::string& entry,
-                const std::string& name, const std::vector<resbuf*>& pairs)
+                const std::string& name, std::vector<resbuf*> pairs)
 {
-    AcDbDictionary* named = nullptr;
-    ASSERT_EQ(db.getNamedObjectsDictionary(named, AcDb::kForWrite), Acad::eOk);
-    AcDbObjectId id;
-    AcDbObject* object = nullptr;
-    AcDbDictionary* level1 = nullptr;
-    if (named->getAt(first, object, AcDb::kForWrite) == Acad::eOk) {
-        level1 = dynamic_cast<AcDbDictionary*>(object);
-    } else {
-        level1 = new AcDbDictionary();
-        ASSERT_EQ(named->setAt(first, level1, id), Acad::eOk);
-    }
-    AcDbDictionary* level2 = nullptr;
-    if (level1->getAt(second, object, AcDb::kForWrite) == Acad::eOk) {
-        level2 = dynamic_cast<AcDbDictionary*>(object);
-    } else {
-        level2 = new AcDbDictionary();
-        ASSERT_EQ(level1->setAt(second, level2, id), Acad::eOk);
-    }
-    auto* record = new AcDbXrecord();
-    ASSERT_EQ(level2->setAt(entry, record, id), Acad::eOk);
-    VelRbBuilder data;
-    data.add(velRbString(kXdRegAppName, "DAZUVUVUD"));
-    data.add(velRbString(kXdAsciiString, "PRJ_NOM"));
-    data.add(velRbString(kXdAsciiString, name));
-    for (resbuf* item : pairs)
-        data.add(item);
-    VelRbPtr list(data.release());
-    ASSERT_EQ(record->setXData(list.get()), Acad::eOk);
-    record->close();
-    level2->close();
-    level1->close();
-    named->close();
+    pairs.insert(pairs.begin(), {velRbString(kXdAsciiString, "PRJ_NOM"), velRbString(kXdAsciiString, name)});
+    FileProjectRecord(db, first, second, entry, pairs);
 }
 
 resbuf* Key(const std::string& key)
@@ -65,21 +38,6 @@ resbuf* Key(const std::string& key)
 const std::string kPipePath = "Réseaux\\\\EU1\\\\Linéaire\\\\EU-001 - Tuyau PVC 200";
 const std::string kPavingPath = "Voirie\\\\Chaussée\\\\Surfacique\\\\TP-004 - Enrobé";
 const std::string kTestsPath = "Divers\\\\Non Graphique\\\\DV-001 - Essais";
-
-CZodEVIAssocLine Line(const std::string& label, int kind, const std::string& key, const std::string& projects,
-                      int projectKind, const std::string& treePath, const std::string& unit, double price)
-{
-    CZodEVIAssocLine line;
-    line.label = label;
-    line.lineKind = kind;
-    line.quantityKey = key;
-    line.projects = projects;
-    line.projectKind = projectKind;
-    line.treePath = treePath;
-    line.unit = unit;
-    line.unitPrice = price;
-    return line;
-}
 
 class EstimateTest : public ::testing::Test {
 protected:
@@ -93,10 +51,15 @@ protected:
                    {Key("\"PRJ_SFC_MAT_Enrobé\""), velRbString(kXdAsciiString, "250.5 m2")});
         AddProject(*db, "VELANTO_PFM_VRD", "PROJECTS", "F1", "Plateforme",
                    {Key("\"prj_sfc_mat_enrobé\""), velRbLong(kXdInteger32, 100)});
-        lines = {Line("Tuyau PVC 200", 3, "\"RSX_TUY_LIN_3D_PVC 200\"", "EU1", 3, kPipePath, "ml", 45.5),
-                 Line("Enrobé", 3, "\"PRJ_SFC_MAT_Enrobé\"", "Route A,Plateforme", 2, kPavingPath, "m²", 12.345),
-                 Line("Essais", 5, "", "**Forfait", 0, kTestsPath, "", 1.005),
-                 Line("Tuyau PVC 200 (EU2)", 3, "\"RSX_TUY_LIN_3D_PVC 200\"", "EU2", 3, kPipePath, "ml", 45.5)};
+        lines = {{.label = "Tuyau PVC 200", .lineKind = 3, .quantityKey = "\"RSX_TUY_LIN_3D_PVC 200\"",
+                  .projects = "EU1", .projectKind = 3, .treePath = kPipePath, .unit = "ml", .unitPrice = 45.5},
+                 {.label = "Enrobé", .lineKind = 3, .quantityKey = "\"PRJ_SFC_MAT_Enrobé\"",
+                  .projects = "Route A,Plateforme", .projectKind = 2, .treePath = kPavingPath, .unit = "m²",
+                  .unitPrice = 12.345},
+                 {.label = "Essais", .lineKind = 5, .projects = "**Forfait", .treePath = kTestsPath,
+                  .unitPrice = 1.005},
+                 {.label = "Tuyau PVC 200 (EU2)", .lineKind = 3, .quantityKey = "\"RSX_TUY_LIN_3D_PVC 200\"",
+                  .projects = "EU2", .projectKind = 3, .treePath = kPipePath, .unit = "ml", .unitPrice = 45.5}};
         for (const auto& [code, path, rate] : {std::tuple{"EU-001", kPipePath, 19.6},
                                               std::tuple{"TP-004", kPavingPath, 19.6},
                                               std::tuple{"DV-001", kTestsPath, 5.5}}) {
@@ -240,8 +203,8 @@ TEST_F(EstimateTest, LineQuantitiesFollowTheirProjectsAndKinds)
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.what);
-        lines = {Line(c.what, c.lineKind, c.key, c.projects, c.projectKind, *c.treePath, "", 2)};
-        lines[0].assocText1 = c.assocText1;
+        lines = {{.label = c.what, .lineKind = c.lineKind, .quantityKey = c.key, .assocText1 = c.assocText1,
+                  .projects = c.projects, .projectKind = c.projectKind, .treePath = *c.treePath, .unitPrice = 2}};
         const metre::Estimate estimate = Build();
         ASSERT_EQ(estimate.RowCount(), 1u);
         const metre::EstimateRow& row = estimate.chapters[0].rows[0];
@@ -257,11 +220,16 @@ TEST_F(EstimateTest, LineQuantitiesFollowTheirProjectsAndKinds)
 // What an estimator must look at before sending, line by line.
 TEST_F(EstimateTest, ChecksBeforeSending)
 {
-    lines = {Line("Bon", 3, "\"PRJ_SFC_MAT_Enrobé\"", "Route A", 2, kPavingPath, "m²", 12),
-             Line("Gratuit", 3, "\"PRJ_SFC_MAT_Enrobé\"", "Route A", 2, kPavingPath, "m²", 0.004),
-             Line("Sans unité", 3, "\"PRJ_SFC_MAT_Enrobé\"", "Route A", 2, kPavingPath, " ", 12),
-             Line("Inconnu", 3, "\"PRJ_SFC_MAT_Enrobé\"", "Route A", 2, "X\\\\Y-1 - Inconnu", "m²", 12),
-             Line("Démesuré", 3, "\"PRJ_SFC_MAT_Enrobé\"", "Route A", 2, kPavingPath, "m²", 1e300)};
+    lines = {{.label = "Bon", .lineKind = 3, .quantityKey = "\"PRJ_SFC_MAT_Enrobé\"", .projects = "Route A",
+              .projectKind = 2, .treePath = kPavingPath, .unit = "m²", .unitPrice = 12},
+             {.label = "Gratuit", .lineKind = 3, .quantityKey = "\"PRJ_SFC_MAT_Enrobé\"", .projects = "Route A",
+              .projectKind = 2, .treePath = kPavingPath, .unit = "m²", .unitPrice = 0.004},
+             {.label = "Sans unité", .lineKind = 3, .quantityKey = "\"PRJ_SFC_MAT_Enrobé\"", .projects = "Route A",
+              .projectKind = 2, .treePath = kPavingPath, .unit = " ", .unitPrice = 12},
+             {.label = "Inconnu", .lineKind = 3, .quantityKey = "\"PRJ_SFC_MAT_Enrobé\"", .projects = "Route A",
+              .projectKind = 2, .treePath = "X\\\\Y-1 - Inconnu", .unit = "m²", .unitPrice = 12},
+             {.label = "Démesuré", .lineKind = 3, .quantityKey = "\"PRJ_SFC_MAT_Enrobé\"", .projects = "Route A",
+              .projectKind = 2, .treePath = kPavingPath, .unit = "m²", .unitPrice = 1e300}};
     const metre::Estimate estimate = Build();
     std::vector<std::string> checks;
     for (const metre::EstimateChapter& chapter : estimate.chapters)
@@ -314,7 +282,8 @@ TEST_F(EstimateTest, CsvCells)
 
 TEST_F(EstimateTest, CsvQuotesWhatWouldSplitACell)
 {
-    lines = {Line("Bordure \"T2\"; pose", 5, "", "**Forfait", 0, kTestsPath, "", 1)};
+    lines = {{.label = "Bordure \"T2\"; pose", .lineKind = 5, .projects = "**Forfait", .treePath = kTestsPath,
+              .unitPrice = 1}};
     const std::string csv = metre::EstimateCsv(Build());
     EXPECT_NE(csv.find("DV-001;\"Bordure \"\"T2\"\"; pose\";"), std::string::npos) << csv;
 }
@@ -497,18 +466,15 @@ protected:
             pointers.push_back(a.get());
         ASSERT_TRUE(metre::WriteScheduleFile(dir.File("VelaBordereau.xml"), pointers));
         metre::RememberSchedulePath(dir.File("VelaBordereau.xml"));
-        previousUI = velSetUI(&ui);
     }
     void TearDown() override
     {
-        velSetUI(previousUI);
         acDocManager->closeAll();
     }
     TempDir dir;
-    std::istringstream script;
-    std::ostringstream output;
-    VelScriptedUI ui{script, output, "devis.scr"};
-    VelUserInterface* previousUI = nullptr;
+    ScriptedSession session{"", "devis.scr"};
+    std::istringstream& script = session.input;
+    std::ostringstream& output = session.output;
 };
 
 TEST_F(EstimateService, EstimatesAreWrittenBesideTheDrawingAndRecordedInIt)
@@ -631,10 +597,10 @@ ExampleEstimate MakeExampleEstimate()
     }
     const metre::ProjectTables tables = metre::ProjectTables::Read(*example.db);
     const auto add = [&](const CZodEVIArticle& a, const std::string& project, int kind) {
-        CZodEVIAssocLine line = Line(a.designation + " (" + project + ")", a.nature == 6 ? 5 : 3, a.quantityKey,
-                                     project, kind, a.treePath, a.unit, a.unitPrice);
-        line.assocText1 = EncodeLineProjects({{project, kind}});
-        example.lines.push_back(line);
+        example.lines.push_back({.label = a.designation + " (" + project + ")", .lineKind = a.nature == 6 ? 5 : 3,
+                                 .quantityKey = a.quantityKey, .assocText1 = EncodeLineProjects({{project, kind}}),
+                                 .projects = project, .projectKind = kind, .treePath = a.treePath, .unit = a.unit,
+                                 .unitPrice = a.unitPrice});
     };
     for (const auto& a : example.schedule) {
         if (a->groupKey.rfind("PRJ_RES(", 0) == 0) {

@@ -2,7 +2,7 @@
 // module's exchange, the currency, and an estimate listed afterwards.
 #include "schedule/schedule_exchange.hpp"
 
-#include "../host/temp_dir.hpp"
+#include "support/temp_dir.hpp"
 #include "module/service_api.hpp"
 #include "module/siblings.hpp"
 #include "ui/config_page.hpp"
@@ -13,6 +13,8 @@
 #include "zodevi/assoc_line.h"
 
 #include <gtest/gtest.h>
+
+#include "support/session.hpp"
 
 #include <sstream>
 
@@ -27,7 +29,6 @@ protected:
     {
         saved = velHostSettings();
         velHostSettings().profileDir = dir.path.string();
-        previousUI = velSetUI(&ui);
         ASSERT_TRUE(acrxLoadModule(VEL_MODULE_DIR "/VelMetre15.arx", false));
         ASSERT_TRUE(acrxServiceIsRegistered(kMetreService));
         bdr.path = dir.File("VelaBordereau.xml");
@@ -36,15 +37,13 @@ protected:
     {
         acDocManager->closeAll();
         velUnloadAllModules();
-        velSetUI(previousUI);
         velHostSettings() = saved;
     }
     TempDir dir;
     VelHostSettings saved;
-    std::istringstream script;
-    std::ostringstream output;
-    VelScriptedUI ui{script, output, "metre.scr"};
-    VelUserInterface* previousUI = nullptr;
+    ScriptedSession session{"", "metre.scr"};
+    std::istringstream& script = session.input;
+    std::ostringstream& output = session.output;
     CZodEVIBdr bdr;
 };
 

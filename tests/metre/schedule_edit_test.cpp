@@ -4,7 +4,8 @@
 #include "schedule_edit.hpp"
 #include "schedule_editor.hpp"
 
-#include "../host/temp_dir.hpp"
+#include "support/session.hpp"
+#include "support/temp_dir.hpp"
 #include "velhost/ui.h"
 
 #include <gtest/gtest.h>
@@ -235,14 +236,12 @@ TEST_F(ScheduleEditor, TerminalEditorEditsTheTable)
                                                       "sed -i 's/^unitPrice = 12.5$/unitPrice = 99/' \"$2\"\n");
     std::filesystem::permissions(editor, std::filesystem::perms::owner_all);
     setenv("VISUAL", editor.c_str(), 1);
-    std::istringstream in;
-    std::ostringstream out;
-    VelTerminalUI ui(in, out, false);
-    VelUserInterface* previous = velSetUI(&ui);
-    const int answer = metre::EditScheduleFile(path, kRegard, &records, &actions);
-    velSetUI(previous);
+    const int answer = [&] {
+        const TerminalAnswers terminal("");
+        return metre::EditScheduleFile(path, kRegard, &records, &actions);
+    }();
     unsetenv("VISUAL");
-    ASSERT_EQ(answer, 0) << out.str();
+    ASSERT_EQ(answer, 0);
     EXPECT_EQ(actions, (std::vector<std::uint32_t>{2, 2}));
     EXPECT_EQ(records.at(1)->unitPrice, 99);
     EXPECT_EQ(dir.Read("position"), "+57\n") << "the line of [article 2]";
@@ -255,14 +254,10 @@ TEST_F(ScheduleEditor, TerminalEditorEditsTheTable)
 TEST_F(ScheduleEditor, TerminalEditorThatFailsChangesNothing)
 {
     setenv("VISUAL", "false", 1);
-    std::istringstream in;
-    std::ostringstream out;
-    VelTerminalUI ui(in, out, false);
-    VelUserInterface* previous = velSetUI(&ui);
+    const TerminalAnswers terminal("");
     EXPECT_NE(metre::EditScheduleFile(path, "", &records, &actions), 0);
-    velSetUI(previous);
     unsetenv("VISUAL");
-    EXPECT_NE(out.str().find("s'est terminé en erreur"), std::string::npos) << out.str();
+    EXPECT_NE(terminal.output.str().find("s'est terminé en erreur"), std::string::npos) << terminal.output.str();
     EXPECT_EQ(dir.Read("VelaBordereau.xml"), original);
 }
 

@@ -4,7 +4,7 @@
 
 #include <gtest/gtest.h>
 
-#include "../host/host_fixture.hpp"
+#include "support/session.hpp"
 #include "velhost/editor.h"
 
 namespace {

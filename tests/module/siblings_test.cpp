@@ -6,8 +6,8 @@
 
 #include <filesystem>
 
-#include "../host/host_fixture.hpp"
-#include "../host/temp_dir.hpp"
+#include "support/session.hpp"
+#include "support/temp_dir.hpp"
 #include "velhost/profile.h"
 
 namespace fs = std::filesystem;

@@ -5,6 +5,8 @@
 
 #include <gtest/gtest.h>
 
+#include "support/session.hpp"
+
 #include <sstream>
 
 #include "network_fixture.hpp"
@@ -57,26 +59,18 @@ class CFakeZodEVISrv : public AcRxService {};
 
 std::string Tagged(const char* network, int index, const char* kind, const char* model, std::vector<double> depths)
 {
-    XData x;
-    x.network = network;
-    x.index = index;
-    x.kind = kind;
-    x.model = model;
-    x.depths = std::move(depths);
-    return x.Text();
+    return XData{.network = network, .index = index, .kind = kind, .model = model, .depths = std::move(depths)}.Text();
 }
 
 class NetworkCommands : public ::testing::Test {
 protected:
     void SetUp() override
     {
-        previousUI = velSetUI(&ui);
         Reset();
     }
     void TearDown() override
     {
         Clean();
-        velSetUI(previousUI);
     }
     void Reset()
     {
@@ -109,10 +103,8 @@ protected:
     bool Printed(const std::string& text) const { return output.str().find(text) != std::string::npos; }
 
     CFakeZodEVISrv service;
-    std::istringstream script;
-    std::ostringstream output;
-    VelScriptedUI ui{script, output, "reseaux.scr"};
-    VelUserInterface* previousUI = nullptr;
+    ScriptedSession session{"", "reseaux.scr"};
+    std::ostringstream& output = session.output;
 };
 
 const std::string kTwoNetworks =

@@ -63,10 +63,7 @@ TEST_F(NetworkModule, ExportedFunctionsWorkOnTheCurrentDrawing)
     EXPECT_EQ(projects(nullptr, &names), 2);
     EXPECT_EQ(projects(&network, nullptr), 2);
 
-    network_test::XData x;
-    x.network = "EU";
-    x.index = 1;
-    x.project = "EU Centre";
+    const network_test::XData x{.network = "EU", .index = 1, .project = "EU Centre"};
     auto database = network_test::DrawingWith(network_test::Line("A01", 0, 0, 0, 10, 0, 0, x.Text()));
     ASSERT_TRUE(database);
     AcDbDatabase* drawing = database.get();

@@ -117,10 +117,7 @@ TEST(NetworkDrawing, LeavesOutWhatItCannotUse)
 
 TEST(NetworkDrawing, KeepsDepthsAndSizesThatRead)
 {
-    XData x;
-    x.depths = {1.2};
-    x.sizes = {2.5, 1.1};
-    const auto database = DrawingWith(Line("A01", 0, 0, 0, 5, 0, 0, x.Text()));
+    const auto database = DrawingWith(Line("A01", 0, 0, 0, 5, 0, 0, XData{.depths = {1.2}, .sizes = {2.5, 1.1}}.Text()));
     ASSERT_TRUE(database);
     const NetworkDrawing drawing = NetworkDrawing::Read(*database);
     const Element& element = OnlyElement(drawing);
@@ -134,13 +131,7 @@ TEST(NetworkDrawing, KeepsDepthsAndSizesThatRead)
 TEST(NetworkDrawing, GroupsByNetworkAndProjectWithoutRegardToCase)
 {
     const auto element = [](const char* network, int index, const char* project, const char* kind, const char* model) {
-        XData x;
-        x.network = network;
-        x.index = index;
-        x.project = project;
-        x.kind = kind;
-        x.model = model;
-        return x.Text();
+        return XData{.network = network, .index = index, .project = project, .kind = kind, .model = model}.Text();
     };
     const std::string entities =
         Line("A01", 0, 0, 0, 10, 0, 0, element("EP", 0, "", "TUY", "PVC 315")) +

@@ -4,26 +4,13 @@
 
 #include <gtest/gtest.h>
 
+#include "support/schedule.hpp"
+
 #include <map>
 #include <string>
 #include <vector>
 
 namespace {
-
-CZodEVIArticle* Add(CZodEVIBdr& bdr, const std::string& groupKey, const std::string& treePath, int nature,
-                    const std::string& key, const std::string& designation)
-{
-    auto article = std::make_unique<CZodEVIArticle>();
-    article->groupKey = groupKey;
-    article->treePath = treePath;
-    article->nature = nature;
-    article->quantityKey = key;
-    article->designation = designation;
-    article->unit = nature == kNatureNonGraphic ? "" : "m³";
-    CZodEVIArticle* added = bdr.AddArticle(std::move(article));
-    bdr.GroupOf(groupKey, true)->push_back(added);
-    return added;
-}
 
 // A small schedule: road articles (one lump sum), an EU network group with its lump sum,
 // the general network, and a lump sum of no project group.
@@ -31,15 +18,20 @@ struct Schedule {
     Schedule()
     {
         const std::string road = MakeRoadGroupKey();
-        Add(bdr, road, "Voirie\\\\Déblais\\\\Volumique\\\\GC-001 - Déblais", kNatureVolume, "\"K1\"", "Déblais");
-        Add(bdr, road, "Voirie\\\\Travaux\\\\Non Graphique\\\\TP-001 - Installation", kNatureNonGraphic, "\"\"",
-            "Installation");
-        Add(bdr, "PRJ_RES(EU)", "EU\\\\Tuyaux\\\\Linéaire\\\\EU-001 - PVC", kNatureLinear, "\"RSX_X\"", "PVC");
-        Add(bdr, "PRJ_RES(EU)", "EU\\\\Travaux\\\\Non Graphique\\\\TP-001 - Piquetage", kNatureNonGraphic, "\"\"",
-            "Piquetage");
-        Add(bdr, "PRJ_RES(RSX_GENERAL)", "Général\\\\Linéaire\\\\G-001 - Réseaux", kNatureLinear, "\"RSX_G\"",
-            "Réseaux");
-        Add(bdr, "0", "Divers\\\\Non Graphique\\\\F-001 - Forfait", kNatureNonGraphic, "", "Forfait");
+        AddFiled(bdr, {.nature = kNatureVolume, .designation = "Déblais", .unit = "m³", .quantityKey = "\"K1\"",
+                       .groupKey = road, .treePath = "Voirie\\\\Déblais\\\\Volumique\\\\GC-001 - Déblais"});
+        AddFiled(bdr, {.nature = kNatureNonGraphic, .designation = "Installation", .quantityKey = "\"\"",
+                       .groupKey = road,
+                       .treePath = "Voirie\\\\Travaux\\\\Non Graphique\\\\TP-001 - Installation"});
+        AddFiled(bdr, {.nature = kNatureLinear, .designation = "PVC", .unit = "m³", .quantityKey = "\"RSX_X\"",
+                       .groupKey = "PRJ_RES(EU)", .treePath = "EU\\\\Tuyaux\\\\Linéaire\\\\EU-001 - PVC"});
+        AddFiled(bdr, {.nature = kNatureNonGraphic, .designation = "Piquetage", .quantityKey = "\"\"",
+                       .groupKey = "PRJ_RES(EU)",
+                       .treePath = "EU\\\\Travaux\\\\Non Graphique\\\\TP-001 - Piquetage"});
+        AddFiled(bdr, {.nature = kNatureLinear, .designation = "Réseaux", .unit = "m³", .quantityKey = "\"RSX_G\"",
+                       .groupKey = "PRJ_RES(RSX_GENERAL)", .treePath = "Général\\\\Linéaire\\\\G-001 - Réseaux"});
+        AddFiled(bdr, {.nature = kNatureNonGraphic, .designation = "Forfait", .groupKey = "0",
+                       .treePath = "Divers\\\\Non Graphique\\\\F-001 - Forfait"});
         bdr.NetworkGroups(networkGroups);
         bdr.RoadProjectArticles(roadArticles);
         bdr.NonGraphicArticles(lumpSums, true);

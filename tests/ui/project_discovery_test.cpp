@@ -9,6 +9,7 @@
 #include <string>
 #include <vector>
 
+#include "support/drawing.hpp"
 #include "velhost/dbase.h"
 
 namespace {
@@ -36,39 +37,13 @@ std::function<resbuf*()> Handle()
     return [] { return velRbString(kXdHandle, "1F"); };
 }
 
-AcDbDictionary* SubDictionary(AcDbDictionary* parent, const char* key)
-{
-    AcDbObject* object = nullptr;
-    if (parent->getAt(key, object, AcDb::kForWrite) == Acad::eOk)
-        return static_cast<AcDbDictionary*>(object);
-    auto created = std::make_unique<AcDbDictionary>();
-    AcDbObjectId id;
-    EXPECT_EQ(parent->setAt(key, created.get(), id), Acad::eOk);
-    return created.release();
-}
-
 // Files one record under first/second/key, its XData made of the items.
 void File(AcDbDatabase& db, const char* first, const char* second, const std::string& key, const Items& items)
 {
-    if (!db.isRegApp(velproj::kRecordApp))
-        db.addRegApp(velproj::kRecordApp);
-    AcDbDictionary* named = nullptr;
-    ASSERT_EQ(db.getNamedObjectsDictionary(named, AcDb::kForWrite), Acad::eOk);
-    AcDbDictionary* a = SubDictionary(named, first);
-    AcDbDictionary* b = SubDictionary(a, second);
-    auto record = std::make_unique<AcDbXrecord>();
-    AcDbObjectId id;
-    ASSERT_EQ(b->setAt(key, record.get(), id), Acad::eOk);
-    VelRbBuilder data;
-    data.add(velRbString(kXdRegAppName, velproj::kRecordApp));
+    std::vector<resbuf*> made;
     for (const auto& item : items)
-        data.add(item());
-    VelRbPtr list(data.release());
-    EXPECT_EQ(record->setXData(list.get()), Acad::eOk);
-    record.release()->close();
-    b->close();
-    a->close();
-    named->close();
+        made.push_back(item());
+    FileProjectRecord(db, first, second, key, made);
 }
 
 void FileRoad(AcDbDatabase& db, const std::string& key, const Items& items)

@@ -4,7 +4,9 @@
 
 #include <gtest/gtest.h>
 
-#include "../host/host_fixture.hpp"
+#include "support/drawing.hpp"
+#include "support/schedule.hpp"
+#include "support/session.hpp"
 #include "module/module_object.hpp"
 #include "module/siblings.hpp"
 #include "velhost/commands.h"
@@ -21,50 +23,15 @@ std::int32_t FakeProjectsOfNetwork(std::string* network, std::vector<std::string
     return 0;
 }
 
-void AddArticle(CZodEVIBdr& bdr, const std::string& group, const std::string& treePath, int nature,
-                const std::string& key, double price, const std::string& unit)
-{
-    auto article = std::make_unique<CZodEVIArticle>();
-    article->groupKey = group;
-    article->treePath = treePath;
-    article->designation = treePath.substr(treePath.find(" - ") + 3);
-    article->nature = nature;
-    article->quantityKey = key;
-    article->unitPrice = price;
-    article->unit = unit;
-    bdr.GroupOf(group, true)->push_back(bdr.AddArticle(std::move(article)));
-}
-
-void FileRecord(AcDbDictionary* named, const char* first, const char* second, const std::string& name,
+void FileRecord(AcDbDatabase& db, const char* first, const char* second, const std::string& name,
                 const std::vector<std::pair<std::string, double>>& quantities)
 {
-    const auto sub = [](AcDbDictionary* parent, const char* key) {
-        AcDbObject* object = nullptr;
-        if (parent->getAt(key, object, AcDb::kForWrite) == Acad::eOk)
-            return static_cast<AcDbDictionary*>(object);
-        auto created = std::make_unique<AcDbDictionary>();
-        AcDbObjectId id;
-        parent->setAt(key, created.get(), id);
-        return created.release();
-    };
-    AcDbDictionary* a = sub(named, first);
-    AcDbDictionary* b = sub(a, second);
-    auto record = std::make_unique<AcDbXrecord>();
-    AcDbObjectId id;
-    b->setAt(name, record.get(), id);
-    VelRbBuilder data;
-    data.add(velRbString(kXdRegAppName, velproj::kRecordApp));
-    data.add(velRbString(kXdAsciiString, velproj::kNameMarker));
-    data.add(velRbString(kXdAsciiString, name));
+    std::vector<resbuf*> items{velRbString(kXdAsciiString, velproj::kNameMarker), velRbString(kXdAsciiString, name)};
     for (const auto& [key, quantity] : quantities) {
-        data.add(velRbString(kXdAsciiString, key));
-        data.add(velRbReal(kXdReal, quantity));
+        items.push_back(velRbString(kXdAsciiString, key));
+        items.push_back(velRbReal(kXdReal, quantity));
     }
-    VelRbPtr list(data.release());
-    record->setXData(list.get());
-    record.release()->close();
-    b->close();
-    a->close();
+    FileProjectRecord(db, first, second, name, items);
 }
 
 // A drawing with two road projects and two EU projects, a schedule whose two road
@@ -74,22 +41,29 @@ protected:
     void SetUp() override
     {
         const std::string road = MakeRoadGroupKey();
-        AddArticle(bdr, road, "Voirie\\\\Terrassements\\\\Volumique\\\\GC-001 - Déblais", 4, "\"K1\"", 9.5, "m³");
-        AddArticle(bdr, road, "Voirie\\\\Bordures\\\\Linéaire\\\\A-001 - Bordure", 2, "\"BT2\"", 32, "ml");
-        AddArticle(bdr, road, "Voirie\\\\Bordures\\\\Ponctuel\\\\A-002 - Bordure", 1, "\"BTN\"", 150, "u");
-        AddArticle(bdr, "PRJ_RES(EU)", "EU\\\\Canalisation\\\\Linéaire\\\\EU-001 - PVC 200", 2, "\"RSX_TUY\"", 48, "ml");
-        AddArticle(bdr, "PRJ_RES(EU)", "EU\\\\Travaux\\\\Non Graphique\\\\TP-001 - Piquetage", 6, "\"\"", 1200, "");
-        AddArticle(bdr, "0", "Divers\\\\Non Graphique\\\\F-001 - Assurance", 6, "", 800, "");
+        AddFiled(bdr, {.unitPrice = 9.5, .nature = 4, .designation = "Déblais", .unit = "m³",
+                       .quantityKey = "\"K1\"", .groupKey = road,
+                       .treePath = "Voirie\\\\Terrassements\\\\Volumique\\\\GC-001 - Déblais"});
+        AddFiled(bdr, {.unitPrice = 32, .nature = 2, .designation = "Bordure", .unit = "ml",
+                       .quantityKey = "\"BT2\"", .groupKey = road,
+                       .treePath = "Voirie\\\\Bordures\\\\Linéaire\\\\A-001 - Bordure"});
+        AddFiled(bdr, {.unitPrice = 150, .nature = 1, .designation = "Bordure", .unit = "u",
+                       .quantityKey = "\"BTN\"", .groupKey = road,
+                       .treePath = "Voirie\\\\Bordures\\\\Ponctuel\\\\A-002 - Bordure"});
+        AddFiled(bdr, {.unitPrice = 48, .nature = 2, .designation = "PVC 200", .unit = "ml",
+                       .quantityKey = "\"RSX_TUY\"", .groupKey = "PRJ_RES(EU)",
+                       .treePath = "EU\\\\Canalisation\\\\Linéaire\\\\EU-001 - PVC 200"});
+        AddFiled(bdr, {.unitPrice = 1200, .nature = 6, .designation = "Piquetage", .quantityKey = "\"\"",
+                       .groupKey = "PRJ_RES(EU)",
+                       .treePath = "EU\\\\Travaux\\\\Non Graphique\\\\TP-001 - Piquetage"});
+        AddFiled(bdr, {.unitPrice = 800, .nature = 6, .designation = "Assurance", .groupKey = "0",
+                       .treePath = "Divers\\\\Non Graphique\\\\F-001 - Assurance"});
 
         auto db = std::make_unique<AcDbDatabase>();
-        db->addRegApp(velproj::kRecordApp);
-        AcDbDictionary* named = nullptr;
-        db->getNamedObjectsDictionary(named, AcDb::kForWrite);
-        FileRecord(named, "VELANTO_ROUT2_DICT", "VELANTO_ROUT2_PROJ", "R1", {{"\"K1\"", 3}, {"\"BT2\"", 10}});
-        FileRecord(named, "VELANTO_ROUT2_DICT", "VELANTO_ROUT2_PROJ", "R2", {{"\"K1\"", 4.5}, {"\"BTN\"", 2}});
-        FileRecord(named, "VELANTO_RSX_VRD", "PROJECTS", "EU 1", {{"\"RSX_TUY\"", 20}});
-        FileRecord(named, "VELANTO_RSX_VRD", "PROJECTS", "EU 2", {{"\"RSX_TUY\"", 5}});
-        named->close();
+        FileRecord(*db, "VELANTO_ROUT2_DICT", "VELANTO_ROUT2_PROJ", "R1", {{"\"K1\"", 3}, {"\"BT2\"", 10}});
+        FileRecord(*db, "VELANTO_ROUT2_DICT", "VELANTO_ROUT2_PROJ", "R2", {{"\"K1\"", 4.5}, {"\"BTN\"", 2}});
+        FileRecord(*db, "VELANTO_RSX_VRD", "PROJECTS", "EU 1", {{"\"RSX_TUY\"", 20}});
+        FileRecord(*db, "VELANTO_RSX_VRD", "PROJECTS", "EU 2", {{"\"RSX_TUY\"", 5}});
         document = acDocManagerPtr()->createDocument(std::move(db), "");
         velRegisterInProcessService(kNetworkService, &network,
                                     {{"Rsx_GetRsxFromType", reinterpret_cast<void*>(&FakeProjectsOfNetwork)}});

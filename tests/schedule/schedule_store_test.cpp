@@ -1,9 +1,8 @@
-// The price-schedule store: numbering, codes, searches, removal, the model search for
-// articles added by hand, and the default file.
+// The price-schedule store: numbering, codes, searches, removal by path and by identity,
+// the model search for articles added by hand, the group indexes, and the default file.
 #include "schedule/schedule_store.hpp"
 
-#include <filesystem>
-#include <fstream>
+#include "support/temp_dir.hpp"
 #include "text/text.hpp"
 
 #include <gtest/gtest.h>
@@ -128,6 +127,28 @@ TEST(CZodEVIBdr, RemoveByTreePath)
     // Its group no longer exists: the article still leaves the schedule.
     EXPECT_TRUE(bdr.RemoveByTreePath("B\\\\X-001 - c"));
     EXPECT_EQ(bdr.Articles().size(), 1u);
+}
+
+// Removal by identity: every group that lists an article forgets it, look-alikes stay,
+// and pointers the store does not hold are ignored.
+TEST(CZodEVIBdr, RemoveArticlesTakesExactlyTheGivenArticles)
+{
+    CZodEVIBdr bdr;
+    CZodEVIArticle* a = Add(bdr, "PRJ_RES(EU 1)", "EU 1\\\\X-001 - a");
+    CZodEVIArticle* twin = Add(bdr, "PRJ_RES(eu 1)", "eu 1\\\\x-001 - A");
+    CZodEVIArticle* b = Add(bdr, "PRJ_RES(EU 1)", "EU 1\\\\X-002 - b");
+    // An article listed by a group other than that of its key is forgotten there too.
+    bdr.GroupOf("autre", true)->push_back(b);
+    CZodEVIArticle stranger;
+
+    EXPECT_EQ(bdr.RemoveArticles({}), 0u);
+    EXPECT_EQ(bdr.RemoveArticles({twin, b, b, &stranger}), 2u);
+    ASSERT_EQ(bdr.Articles().size(), 1u);
+    EXPECT_EQ(bdr.Articles()[0].get(), a);
+    EXPECT_EQ(*bdr.GroupOf("PRJ_RES(EU 1)", false), CZodEVIGroup{a});
+    EXPECT_TRUE(bdr.GroupOf("PRJ_RES(eu 1)", false)->empty());
+    EXPECT_TRUE(bdr.GroupOf("autre", false)->empty());
+    EXPECT_EQ(bdr.RemoveArticles({&stranger}), 0u);
 }
 
 struct EditedCase {
@@ -521,14 +542,6 @@ TEST(CZodEVIBdr, IndexesFollowARandomMixOfEdits)
     }
 }
 
-TEST(PurgeFlag, OffUntilArmed)
-{
-    EXPECT_FALSE(GetPurgeFlag());
-    SetPurgeFlag(true);
-    EXPECT_TRUE(GetPurgeFlag());
-    SetPurgeFlag(false);
-}
-
 // Stands in for the main services and the parameter reader.
 class FakeEnvironment : public CZodEVIBdrEnvironment {
 public:
@@ -555,12 +568,12 @@ public:
 
 TEST(CZodEVIBdr, DefaultFileResolution)
 {
-    const std::filesystem::path existing = std::filesystem::temp_directory_path() / "vel_bdr_existant.xml";
-    std::ofstream(existing) << "<bordereau/>";
+    const TempDir dir;
+    const std::string existing = dir.Write("existant.xml", "<bordereau/>");
 
     struct Case { const char* name; std::string stored; std::map<int, std::string> found; std::string path; std::vector<int> asked; };
     const Case cases[] = {
-        {"stored file exists", existing.string(), {}, existing.string(), {}},
+        {"stored file exists", existing, {}, existing, {}},
         {"stored file missing", "/nulle/part.xml", {{0x27, "/trouve/VelaBordereau.xml"}}, "/trouve/VelaBordereau.xml", {4, 7, 0x27}},
         {"nothing stored", "", {{4, "/a/VelaBordereau.xml"}}, "/a/VelaBordereau.xml", {4}},
         {"nothing found", "", {}, "/donnees/VelaBordereau.xml", {4, 7, 0x27, 0x37}},
@@ -577,7 +590,6 @@ TEST(CZodEVIBdr, DefaultFileResolution)
         EXPECT_EQ(environment.asked, c.asked);
         EXPECT_EQ(bdr.nextNumber, 1);
     }
-    std::filesystem::remove(existing);
     CZodEVIBdr alone;
     EXPECT_EQ(alone.path, "VelaBordereau.xml");
 }

@@ -13,8 +13,8 @@
 #include <limits>
 
 #include "../host/file_faults.hpp"
-#include "../host/host_fixture.hpp"
-#include "../host/temp_dir.hpp"
+#include "support/session.hpp"
+#include "support/temp_dir.hpp"
 #include "velhost/profile.h"
 #include "velhost/rx.h"
 
@@ -75,20 +75,6 @@ protected:
     ScriptedSession session;
 };
 
-// The user's answers, on a terminal rather than in a script.
-class TerminalAnswers {
-public:
-    explicit TerminalAnswers(const std::string& answers) : input(answers), ui(input, output, false)
-    {
-        previous = velSetUI(&ui);
-    }
-    ~TerminalAnswers() { velSetUI(previous); }
-    std::istringstream input;
-    std::ostringstream output;
-    VelTerminalUI ui;
-    VelUserInterface* previous = nullptr;
-};
-
 TEST_F(ModuleApi, PricesThroughUpdateSetWriteAndRead)
 {
     auto* getPrice = Function<ZodEVI_GetBdrPriceFn>("ZodEVI_GetBdrPrice");
@@ -125,6 +111,31 @@ TEST_F(ModuleApi, PricesThroughUpdateSetWriteAndRead)
     EXPECT_EQ(read(), kZodEVIOk);
     EXPECT_EQ(getPrice(&pipeLength, &pvc, &price, "EU 1"), kZodEVIOk);
     EXPECT_EQ(price, 48.5);
+}
+
+// Without the metre module the schedule can neither be read nor written: both say so, the
+// failed read leaves the schedule empty, and the file stays as it was.
+TEST_F(ModuleApi, ReadAndWriteWithoutTheMetreModule)
+{
+    auto* getPrice = Function<ZodEVI_GetBdrPriceFn>("ZodEVI_GetBdrPrice");
+    auto* write = Function<ZodEVI_WriteBdrFn>("ZodEVI_WriteBdr");
+    auto* read = Function<ZodEVI_ReadBdrFn>("ZodEVI_ReadBdr");
+    ASSERT_TRUE(getPrice && write && read);
+    ASSERT_EQ(UpdateNetwork(1, "EU 1", {"PVC 200"}), kZodEVIOk);
+    ASSERT_EQ(write(), kZodEVIOk);
+    const std::string written = Schedule();
+
+    ASSERT_TRUE(acrxUnloadModule("VelMetre15.arx"));
+    velHostSettings().modulesDir = dir.File("vide");
+    const std::int32_t pipeLength = kZodEVIPipeLength;
+    const std::string pvc = "PVC 200";
+    double price = 1;
+    EXPECT_EQ(write(), kZodEVIFailed);
+    EXPECT_EQ(getPrice(&pipeLength, &pvc, &price, "EU 1"), kZodEVIOk);
+    EXPECT_EQ(read(), kZodEVIFailed);
+    EXPECT_EQ(getPrice(&pipeLength, &pvc, &price, "EU 1"), kZodEVINotFound);
+    EXPECT_EQ(write(), kZodEVIFailed);
+    EXPECT_EQ(Schedule(), written);
 }
 
 TEST_F(ModuleApi, BadArgumentsAnswerAStatusAndChangeNothing)
@@ -254,16 +265,6 @@ TEST_F(ModuleApi, RoadAndEarthworkUpdatesAnswerWhetherTheyChangedSomething)
         EXPECT_EQ(c.call(), kZodEVIOk);
         EXPECT_EQ(c.call(), kZodEVIFailed); // the same again creates nothing
     }
-}
-
-TEST_F(ModuleApi, ShowPriceSaysWhenNoArticleCountsTheItem)
-{
-    auto* show = Function<ZodEVI_ShowBdrPriceFn>("ZodEVI_ShowBdrPrice");
-    const std::int32_t selector = kZodEVIFittingCount;
-    const std::string item = "Regard inconnu";
-    EXPECT_EQ(show(&selector, &item, "EU 1"), kZodEVIFailed);
-    EXPECT_NE(session.Output().find("ERREUR : aucun article ne se réfère à l'élément !"), std::string::npos)
-        << session.Output();
 }
 
 TEST_F(ModuleApi, UnreadableScheduleIsNeverWrittenOver)

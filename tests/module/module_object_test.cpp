@@ -1,21 +1,52 @@
-// The module object: start-up and shutdown through the host, the command list, and the
-// refusal to start without the main services.
+// The module object: start-up and shutdown through the host's messages, its configuration
+// page, the command list, and the refusal to start without the main services.
 #include "module/module_object.hpp"
 
 #include <gtest/gtest.h>
 
 #include <memory>
 
-#include "../host/host_fixture.hpp"
-#include "../host/temp_dir.hpp"
+#include "support/session.hpp"
+#include "support/temp_dir.hpp"
 #include "velhost/commands.h"
 #include "velhost/profile.h"
+#include "velsiblings/config_services.h"
 #include "velsiblings/main_services.h"
 #include "zodevi/api.h"
 
 namespace {
 
 void Nothing() {}
+
+AcRxDictionary* Services()
+{
+    return static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"));
+}
+
+CVelConfigServices* ConfigServices()
+{
+    return static_cast<CVelConfigServices*>(Services()->at(kVelConfigServicesName));
+}
+
+// Main services whose answer to UnloadQuery the test chooses.
+class FakeMainServices : public CVelMainServices {
+public:
+    void ShowInfo(const std::string&) override {}
+    std::string GetProductName() const override { return "VELANTO"; }
+    std::string GetDataFolder(int) override { return "/"; }
+    std::string GetParameterFile() override { return "/Velanto.ini"; }
+    void RegisterModule(const std::string& name) override { modules.push_back(name); }
+    void UnregisterModule(const std::string& name) override { std::erase(modules, name); }
+    std::vector<std::string> RegisteredModules() const override { return modules; }
+    void* GetParentWindow() override { return this; }
+    bool UnloadQuery() override { return unloading; }
+    std::string FindDataFile(const std::string&, int) override { return ""; }
+    void ShowCommandList(const std::string&, const std::string&, int, int, const std::vector<std::string>&) override {}
+    const char* GetMessageText(int) override { return ""; }
+
+    std::vector<std::string> modules;
+    bool unloading = false;
+};
 
 class ModuleObject : public ::testing::Test {
 protected:
@@ -97,9 +128,16 @@ TEST_F(ModuleObject, StartsAndStopsThroughTheHost)
     ASSERT_TRUE(acrxLoadModule(kVelMainServicesModule, false));
     CZodEVIBdr bdr;
     SetCurrentBdr(&bdr);
+    ASSERT_TRUE(acrxLoadModule(kVelConfigServicesModule, false));
     CVelSrvModul module;
-    ASSERT_EQ(module.Init(), 1);
+    ASSERT_EQ(module.OnAppMessage(AcRx::kInitAppMsg, nullptr), AcRx::kRetOK);
     EXPECT_TRUE(acrxServiceIsRegistered(kZodEVIServiceName));
+    const std::vector<VelConfigPageEntry> pages = ConfigServices()->RegisteredPages();
+    ASSERT_EQ(pages.size(), 1u);
+    EXPECT_EQ(pages[0].moduleName, "VelVuzazORE");
+    EXPECT_EQ(pages[0].createFunction, "Vel_ZodEVI_CfgUser");
+    EXPECT_EQ(pages[0].section, "Métré");
+    EXPECT_EQ(pages[0].pageTitle, "Métré");
     ASSERT_NE(module.service, nullptr);
     EXPECT_EQ(module.service->GetApplicationName(), "VelVuzazORE15");
     EXPECT_EQ(module.service->GetVersion(), "10.0");
@@ -122,17 +160,37 @@ TEST_F(ModuleObject, StartsAndStopsThroughTheHost)
 
 TEST_F(ModuleObject, RefusesToStartWhenTheMainServicesWereNotThere)
 {
+    ASSERT_TRUE(acrxLoadModule(kVelConfigServicesModule, false));
     ASSERT_FALSE(acrxServiceIsRegistered(kVelMainServicesName));
     CVelSrvModul module;
-    EXPECT_EQ(module.Init(), 0);
+    EXPECT_EQ(module.OnAppMessage(AcRx::kInitAppMsg, nullptr), AcRx::kRetError);
     const std::string out = session.Output();
-    EXPECT_NE(out.find("Le module VelVuzazORE15 ne peut pas démarrer"), std::string::npos) << out;
+    EXPECT_NE(out.find("(erreur)]\nLe module VelVuzazORE15 ne peut pas démarrer"), std::string::npos) << out;
     EXPECT_NE(out.find("puis chargez de nouveau ce module."), std::string::npos) << out;
     EXPECT_FALSE(acrxServiceIsRegistered(kZodEVIServiceName));
     EXPECT_TRUE(GroupCommands().empty());
+    EXPECT_TRUE(ConfigServices()->RegisteredPages().empty());
 }
 
-TEST_F(ModuleObject, EntryDetailsAndServiceDefaults)
+// Main services that are themselves going away no longer keep the list of modules: the
+// module leaves it only while they stay.
+TEST_F(ModuleObject, UnloadUnregistersOnlyFromMainServicesThatStay)
+{
+    for (const bool going : {false, true}) {
+        SCOPED_TRACE(going ? "main services unloading" : "main services staying");
+        FakeMainServices main;
+        main.unloading = going;
+        main.modules = {"VelVuzazORE15", "Autre"};
+        velRegisterInProcessService(kVelMainServicesName, &main, {});
+        CVelSrvModul module;
+        module.Unload();
+        Services()->remove(kVelMainServicesName);
+        EXPECT_EQ(main.modules, going ? (std::vector<std::string>{"VelVuzazORE15", "Autre"})
+                                      : (std::vector<std::string>{"Autre"}));
+    }
+}
+
+TEST_F(ModuleObject, ModuleNameWithoutVersion)
 {
     struct Case {
         const char* name;
@@ -141,11 +199,6 @@ TEST_F(ModuleObject, EntryDetailsAndServiceDefaults)
     const Case cases[] = {{"VelVuzazORE15", "VelVuzazORE"}, {"A51", "A"}, {"Mod", "Mod"}, {"15", ""}};
     for (const Case& c : cases)
         EXPECT_EQ(ModuleNameWithoutVersion(c.name), c.expected);
-    CVelZodEVISrv service;
-    EXPECT_EQ(service.GetApplicationName(), "???");
-    EXPECT_EQ(service.GetVersion(), "10.0");
-    service.SetVersion("17.2");
-    EXPECT_EQ(service.GetVersion(), "17.2");
 }
 
 } // namespace

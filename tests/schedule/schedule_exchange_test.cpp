@@ -1,6 +1,6 @@
 // The exchange with the metre module, against an in-process stand-in whose answers each
-// test sets: reading with the project-wide articles, prices by selector, the editor's
-// changes and the faults of partial reads and regrouped modifications.
+// test sets: reading with the road articles, prices by selector, the editor's changes
+// and the file written after them, partial reads and a missing module.
 #include "schedule/schedule_exchange.hpp"
 
 #include "module/siblings.hpp"
@@ -10,7 +10,9 @@
 
 #include <gtest/gtest.h>
 
-#include <deque>
+#include "support/session.hpp"
+
+#include <algorithm>
 #include <sstream>
 
 namespace {
@@ -56,20 +58,6 @@ std::int32_t FakeEdit(std::string, std::vector<CZodEVIArticle*>* records, std::v
     return g_fake->editorAnswer;
 }
 
-CZodEVIArticle Article(const std::string& code, const std::string& key, const std::string& group,
-                       const std::string& treePath, double price = 0, int nature = 2)
-{
-    CZodEVIArticle a;
-    a.code = code;
-    a.quantityKey = key;
-    a.groupKey = group;
-    a.treePath = treePath;
-    a.unitPrice = price;
-    a.nature = nature;
-    a.designation = code;
-    return a;
-}
-
 class ScheduleExchange : public ::testing::Test {
 protected:
     void SetUp() override
@@ -79,19 +67,11 @@ protected:
                                     {{"VtMetre_RemplitTableau", reinterpret_cast<void*>(&FakeFill)},
                                      {"VtMetre_ExporterXml", reinterpret_cast<void*>(&FakeExport)},
                                      {"VtMetre_EditerBordereau", reinterpret_cast<void*>(&FakeEdit)}});
-        previousUI = velSetUI(&ui);
     }
     void TearDown() override
     {
-        velSetUI(previousUI);
         delete static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"))->remove(kMetreService);
         g_fake = nullptr;
-    }
-    std::size_t TemplatesOfKind(int kind)
-    {
-        CZodEVIArtTemplateArray selection;
-        selection.SetOwning(false);
-        return static_cast<std::size_t>(bdr.Catalogue().SelectKind(kind, selection));
     }
     std::size_t GroupSize(const std::string& key)
     {
@@ -101,49 +81,77 @@ protected:
 
     FakeMetre fake;
     CZodEVIBdr bdr;
-    std::istringstream script;
-    std::ostringstream output;
-    VelScriptedUI ui{script, output, "test.scr"};
-    VelUserInterface* previousUI = nullptr;
+    ScriptedSession session{"", "test.scr"};
+    std::ostringstream& output = session.output;
 };
 
 const std::string kRoad = "PRJ_PFM(),PRJ_RTE(),PRJ_PCV()";
 
-TEST_F(ScheduleExchange, ReadAddsProjectWideArticlesOnce)
+// A schedule without road articles gets the three lump sums, the cut and fill volumes and
+// the road sawing, numbered and coded after the file's articles; a second read adds nothing.
+TEST_F(ScheduleExchange, ReadAddsTheSixRoadArticlesOnce)
 {
-    fake.file = {Article("EU-001", "\"RSX_TUY_LIN_3D_PVC 200\"", "PRJ_RES(EU1)", "Réseaux\\\\EU1\\\\EU-001 - Tuyau")};
-    ASSERT_TRUE(Read(bdr));
-    const std::size_t added = TemplatesOfKind(1) + TemplatesOfKind(41) + TemplatesOfKind(42) + TemplatesOfKind(50);
-    ASSERT_GT(added, 3u);
-    EXPECT_EQ(bdr.Articles().size(), 1 + added);
-    EXPECT_EQ(GroupSize(kRoad), added);
-    for (const auto& article : bdr.Articles())
-        if (article->groupKey == kRoad) {
-            EXPECT_EQ(article->metreInt4, 0);
-            EXPECT_NE(article->number, -1);
-            EXPECT_NE(article->treePath.find(article->code + " - " + article->designation), std::string::npos);
+    struct Expected {
+        const char* code;
+        const char* key;
+        int nature;
+        const char* unit;
+        const char* treePath;
+    };
+    const Expected expected[] = {
+        {"TP-001", "\"\"", 6, "", "Voirie\\\\Travaux préparatoires\\\\Non Graphique\\\\TP-001 - Installation du chantier"},
+        {"TP-002", "\"\"", 6, "", "Voirie\\\\Travaux préparatoires\\\\Non Graphique\\\\TP-002 - Signalisation provisoire du chantier"},
+        {"TP-003", "\"\"", 6, "",
+         "Voirie\\\\Travaux préparatoires\\\\Non Graphique\\\\TP-003 - Implantation, plan de phasage et contrôle"},
+        {"GC-001", "\"PRJ_VOL_TOT_DBL\"", 4, "m³", "Voirie\\\\Terrassements\\\\Déblais\\\\Volumique\\\\GC-001 - Volume des déblais"},
+        {"GC-002", "\"PRJ_VOL_TOT_RBL\"", 4, "m³", "Voirie\\\\Terrassements\\\\Remblais\\\\Volumique\\\\GC-002 - Volume des remblais"},
+        {"GC-003", "\"PRJ_SCI_LIN_3D\"", 2, "ml",
+         "Voirie\\\\Travaux sur chaussées existantes\\\\Linéaire\\\\GC-003 - Sciage de chaussée"},
+    };
+    fake.file = {{.code = "EU-001", .number = 1, .quantityKey = "\"RSX_TUY_LIN_3D_PVC 200\"", .groupKey = "PRJ_RES(EU1)",
+                  .treePath = "Réseaux\\\\EU1\\\\EU-001 - Tuyau"}};
+    for (int pass = 1; pass <= 2; ++pass) {
+        SCOPED_TRACE("read " + std::to_string(pass));
+        ASSERT_TRUE(Read(bdr));
+        ASSERT_EQ(bdr.Articles().size(), 1 + std::size(expected));
+        ASSERT_EQ(GroupSize(kRoad), std::size(expected));
+        const CZodEVIGroup& road = *bdr.Groups().Find(kRoad);
+        for (std::size_t i = 0; i < std::size(expected); ++i) {
+            const Expected& e = expected[i];
+            SCOPED_TRACE(e.code);
+            const CZodEVIArticle& a = *road[i];
+            EXPECT_EQ(a.code, e.code);
+            EXPECT_EQ(a.quantityKey, e.key);
+            EXPECT_EQ(a.nature, e.nature);
+            EXPECT_EQ(a.unit, e.unit);
+            EXPECT_EQ(a.treePath, e.treePath);
+            EXPECT_EQ(a.groupKey, kRoad);
+            EXPECT_EQ(a.number, static_cast<int>(i) + 2);
+            EXPECT_EQ(a.metreInt4, 0);
         }
-    ASSERT_TRUE(Write(bdr));
-    ASSERT_TRUE(Read(bdr));
-    EXPECT_EQ(bdr.Articles().size(), 1 + added) << "a second read must add nothing";
+        ASSERT_TRUE(Write(bdr));
+    }
 }
 
 TEST_F(ScheduleExchange, ReadWithCutVolumeAddsOnlyFillAndSawing)
 {
-    fake.file = {Article("GC-001", "\"PRJ_VOL_TOT_DBL\"", kRoad, "Voirie\\\\Volumique\\\\GC-001 - Déblais")};
+    fake.file = {{.code = "GC-001", .quantityKey = "\"PRJ_VOL_TOT_DBL\"", .groupKey = kRoad,
+                  .treePath = "Voirie\\\\Volumique\\\\GC-001 - Déblais"}};
     ASSERT_TRUE(Read(bdr));
-    EXPECT_EQ(GroupSize(kRoad), 1 + TemplatesOfKind(42) + TemplatesOfKind(50));
-    int cutVolumes = 0;
-    for (const auto& article : bdr.Articles())
-        cutVolumes += article->quantityKey == "\"PRJ_VOL_TOT_DBL\"";
-    EXPECT_EQ(cutVolumes, 1);
+    std::vector<std::string> keys;
+    for (const CZodEVIArticle* a : *bdr.Groups().Find(kRoad))
+        keys.push_back(a->quantityKey);
+    EXPECT_EQ(keys, (std::vector<std::string>{"\"PRJ_VOL_TOT_DBL\"", "\"PRJ_VOL_TOT_RBL\"", "\"PRJ_SCI_LIN_3D\""}));
 }
 
 TEST_F(ScheduleExchange, FailedPartialReadLeavesStoreEmpty)
 {
-    fake.file = {Article("A-001", "\"A\"", "PRJ_RES(EU1)", "X\\\\A-001 - A"),
-                 Article("A-002", "\"B\"", "PRJ_RES(EU1)", "X\\\\A-002 - B"),
-                 Article("A-003", "\"C\"", "0", "X\\\\A-003 - C")};
+    fake.file = {CZodEVIArticle{.code = "A-001", .quantityKey = "\"A\"", .groupKey = "PRJ_RES(EU1)",
+                                .treePath = "X\\\\A-001 - A"},
+                 CZodEVIArticle{.code = "A-002", .quantityKey = "\"B\"", .groupKey = "PRJ_RES(EU1)",
+                                .treePath = "X\\\\A-002 - B"},
+                 CZodEVIArticle{.code = "A-003", .quantityKey = "\"C\"", .groupKey = "0",
+                                .treePath = "X\\\\A-003 - C"}};
     fake.failAfterPartialRead = true;
     EXPECT_FALSE(Read(bdr));
     EXPECT_TRUE(bdr.Articles().empty());
@@ -167,8 +175,9 @@ TEST_F(ScheduleExchange, PricesBySelector)
                                     "RSX_SBL_FRNT_NB_", "PRJ_VOL_MAT_",    "PRJ_SFC_MAT_",         "PRJ_LIN_MAT_",
                                     "PRJ_TON_MAT_"};
     for (int s = 0; s <= 12; ++s)
-        fake.file.push_back(Article(FormatString("P-%03d", s), FormatString("\"%sPVC 200\"", patterns[s]),
-                                    s <= 8 ? "PRJ_RES(EU1)" : kRoad, FormatString("Cat\\\\P-%03d - x", s), 10 + s));
+        fake.file.push_back({.code = FormatString("P-%03d", s), .unitPrice = 10.0 + s,
+                             .quantityKey = FormatString("\"%sPVC 200\"", patterns[s]),
+                             .groupKey = s <= 8 ? "PRJ_RES(EU1)" : kRoad, .treePath = FormatString("Cat\\\\P-%03d - x", s)});
     ASSERT_TRUE(Read(bdr));
     for (int s = 0; s <= 12; ++s) {
         SCOPED_TRACE(s);
@@ -194,8 +203,10 @@ TEST_F(ScheduleExchange, PricesBySelector)
 
 TEST_F(ScheduleExchange, EmptyNetworkMeansGeneralForGetPriceButEveryGroupForShowPrice)
 {
-    fake.file = {Article("EU-001", "\"RSX_FRX_NB_Té\"", "PRJ_RES(EU1)", "R\\\\EU1\\\\EU-001 - Té EU"),
-                 Article("GE-001", "\"RSX_FRX_NB_Té\"", "PRJ_RES(RSX_GENERAL)", "R\\\\GE-001 - Té général", 7)};
+    fake.file = {CZodEVIArticle{.code = "EU-001", .quantityKey = "\"RSX_FRX_NB_Té\"", .groupKey = "PRJ_RES(EU1)",
+                                .treePath = "R\\\\EU1\\\\EU-001 - Té EU"},
+                 CZodEVIArticle{.code = "GE-001", .unitPrice = 7, .quantityKey = "\"RSX_FRX_NB_Té\"",
+                                .groupKey = "PRJ_RES(RSX_GENERAL)", .treePath = "R\\\\GE-001 - Té général"}};
     ASSERT_TRUE(Read(bdr));
     double price = 0;
     EXPECT_TRUE(GetPrice(bdr, 3, "Té", price, ""));
@@ -208,9 +219,12 @@ TEST_F(ScheduleExchange, EmptyNetworkMeansGeneralForGetPriceButEveryGroupForShow
 
 TEST_F(ScheduleExchange, PricesPerNetworkKeepEveryDigit)
 {
-    fake.file = {Article("GE-001", "\"RSX_TUY_LIN_3D_PVC\"", "PRJ_RES(RSX_GENERAL)", "R\\\\GE-001 - a", 12345.67),
-                 Article("EU-001", "\"RSX_TUY_LIN_3D_PVC\"", "PRJ_RES(EU (tranche 2))", "R\\\\EU-001 - b", 1500000),
-                 Article("EP-001", "\"RSX_TUY_LIN_3D_PVC\"", "PRJ_RES(EP1)", "R\\\\EP-001 - c", 0.1)};
+    fake.file = {CZodEVIArticle{.code = "GE-001", .unitPrice = 12345.67, .quantityKey = "\"RSX_TUY_LIN_3D_PVC\"",
+                                .groupKey = "PRJ_RES(RSX_GENERAL)", .treePath = "R\\\\GE-001 - a"},
+                 CZodEVIArticle{.code = "EU-001", .unitPrice = 1500000, .quantityKey = "\"RSX_TUY_LIN_3D_PVC\"",
+                                .groupKey = "PRJ_RES(EU (tranche 2))", .treePath = "R\\\\EU-001 - b"},
+                 CZodEVIArticle{.code = "EP-001", .unitPrice = 0.1, .quantityKey = "\"RSX_TUY_LIN_3D_PVC\"",
+                                .groupKey = "PRJ_RES(EP1)", .treePath = "R\\\\EP-001 - c"}};
     ASSERT_TRUE(Read(bdr));
     std::map<std::string, std::string> prices;
     ASSERT_TRUE(GetPricesPerNetwork(bdr, 0, "PVC", prices));
@@ -224,51 +238,76 @@ TEST_F(ScheduleExchange, PricesPerNetworkKeepEveryDigit)
     EXPECT_TRUE(prices.empty());
 }
 
-TEST_F(ScheduleExchange, EditDeletesAndAddsBesideAnAssociatedArticle)
+// The editor's changes, through Edit and through the display of a price: Edit applies
+// them only when the editor succeeds, the display whatever it answers. The file is
+// written again only when an added article took its group key from a neighbour; an
+// article the editor moved to another group is already so in the file.
+TEST_F(ScheduleExchange, EditorChangesAndTheFileWrittenAfterThem)
 {
-    fake.file = {Article("EU-001", "\"RSX_TUY_LIN_3D_PVC\"", "PRJ_RES(EU1)", "Réseaux\\\\EU1\\\\Linéaire\\\\EU-001 - Tuyau"),
-                 Article("EU-002", "\"RSX_TUY_NB_PVC\"", "PRJ_RES(EU1)", "Réseaux\\\\EU1\\\\Linéaire\\\\EU-002 - Nombre")};
-    ASSERT_TRUE(Read(bdr));
-    const std::size_t before = bdr.Articles().size();
-    fake.writes = 0;
-    CZodEVIArticle added = Article("EU-009", "", "0", "Réseaux\\\\EU1\\\\Linéaire\\\\EU-009 - Regard");
-    fake.editorChanges = {{fake.file[1], kEditDeleted}, {added, kEditAdded}};
-    ASSERT_TRUE(Edit(bdr, ""));
-    EXPECT_EQ(bdr.Articles().size(), before);
-    EXPECT_FALSE(bdr.FindByTreePath(fake.file.empty() ? "" : "Réseaux\\\\EU1\\\\Linéaire\\\\EU-002 - Nombre"));
-    const CZodEVIArticle* stored = bdr.FindByTreePath(added.treePath).article;
-    ASSERT_NE(stored, nullptr);
-    EXPECT_EQ(stored->groupKey, "PRJ_RES(EU1)");
-    EXPECT_EQ(GroupSize("PRJ_RES(EU1)"), 2u);
-    EXPECT_EQ(fake.writes, 1) << "the new group key must reach the file";
-}
-
-TEST_F(ScheduleExchange, ModificationWithNewGroupKeyMovesToThatGroup)
-{
-    fake.file = {Article("EU-001", "\"K\"", "PRJ_RES(EU1)", "R\\\\EU-001 - a", 5)};
-    ASSERT_TRUE(Read(bdr));
-    CZodEVIArticle moved = fake.file[0];
-    moved.groupKey = "PRJ_RES(EU2)";
-    moved.unitPrice = 8;
-    fake.editorChanges = {{moved, kEditModified}, {Article("X", "", "0", "nowhere"), kEditModified}};
-    ASSERT_TRUE(Edit(bdr, "R\\\\EU-001 - a"));
-    EXPECT_EQ(fake.editorLabel, "R\\\\EU-001 - a");
-    EXPECT_EQ(GroupSize("PRJ_RES(EU1)"), 0u);
-    ASSERT_EQ(GroupSize("PRJ_RES(EU2)"), 1u);
-    EXPECT_EQ(bdr.Groups().Find("PRJ_RES(EU2)")->front()->unitPrice, 8);
-    double price = 0;
-    EXPECT_TRUE(GetPrice(bdr, 9, "x", price, "") == false);
-}
-
-TEST_F(ScheduleExchange, EditorThatFailsChangesNothing)
-{
-    fake.file = {Article("EU-001", "\"K\"", "PRJ_RES(EU1)", "R\\\\EU-001 - a")};
-    ASSERT_TRUE(Read(bdr));
-    const std::size_t before = bdr.Articles().size();
-    fake.editorAnswer = 1;
-    fake.editorChanges = {{fake.file[0], kEditDeleted}};
-    EXPECT_FALSE(Edit(bdr, ""));
-    EXPECT_EQ(bdr.Articles().size(), before);
+    const std::string pipe = "Réseaux\\\\EU1\\\\Linéaire\\\\EU-001 - Tuyau";
+    const std::string count = "Réseaux\\\\EU1\\\\Linéaire\\\\EU-002 - Nombre";
+    const std::string added = "Réseaux\\\\EU1\\\\Linéaire\\\\EU-009 - Regard";
+    enum Changes { AddBesideAssociated, MoveToAnotherGroup };
+    struct Case {
+        const char* name;
+        bool show; // through ShowPrice, else Edit
+        std::int32_t editorAnswer;
+        Changes changes;
+        bool answer;
+        bool applied;
+        int writes;
+    };
+    const Case cases[] = {
+        {"edit adds beside an associated article", false, 0, AddBesideAssociated, true, true, 1},
+        {"edit whose editor fails", false, 1, AddBesideAssociated, false, false, 0},
+        {"edit moves an article", false, 0, MoveToAnotherGroup, true, true, 0},
+        {"price shown, article added", true, 0, AddBesideAssociated, true, true, 1},
+        {"price display that fails, article added", true, 1, AddBesideAssociated, false, true, 1},
+        {"price display that fails, article moved", true, 1, MoveToAnotherGroup, false, true, 0},
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.name);
+        fake = {};
+        fake.file = {{.code = "EU-001", .unitPrice = 5, .quantityKey = "\"RSX_TUY_LIN_3D_PVC\"", .groupKey = "PRJ_RES(EU1)",
+                      .treePath = pipe},
+                     {.code = "EU-002", .quantityKey = "\"RSX_TUY_NB_PVC\"", .groupKey = "PRJ_RES(EU1)",
+                      .treePath = count}};
+        ASSERT_TRUE(Read(bdr));
+        fake.editorAnswer = c.editorAnswer;
+        if (c.changes == AddBesideAssociated) {
+            fake.editorChanges = {{fake.file[1], kEditDeleted},
+                                  {{.code = "EU-009", .groupKey = "0", .treePath = added}, kEditAdded}};
+        } else {
+            CZodEVIArticle moved = fake.file[0];
+            moved.groupKey = "PRJ_RES(EU2)";
+            moved.unitPrice = 8;
+            // A modification of an article the schedule does not hold is dropped.
+            fake.editorChanges = {{moved, kEditModified}, {{.code = "X", .groupKey = "0",
+                                                            .treePath = "nulle part"}, kEditModified}};
+        }
+        const std::size_t before = bdr.Articles().size();
+        EXPECT_EQ(c.show ? ShowPrice(bdr, 0, "PVC", "EU1") : Edit(bdr, pipe), c.answer);
+        EXPECT_EQ(fake.editorLabel, pipe);
+        EXPECT_EQ(fake.writes, c.writes);
+        EXPECT_EQ(bdr.Articles().size(), before);
+        if (c.changes == AddBesideAssociated) {
+            EXPECT_EQ(!bdr.FindByTreePath(count), c.applied);
+            const CZodEVIArticle* stored = bdr.FindByTreePath(added).article;
+            ASSERT_EQ(stored != nullptr, c.applied);
+            if (stored != nullptr) {
+                EXPECT_EQ(stored->groupKey, "PRJ_RES(EU1)");
+            }
+            const auto inFile = std::find_if(fake.file.begin(), fake.file.end(),
+                                             [&](const CZodEVIArticle& a) { return a.treePath == added; });
+            EXPECT_EQ(inFile != fake.file.end() && inFile->groupKey == "PRJ_RES(EU1)", c.writes > 0);
+        } else {
+            EXPECT_EQ(GroupSize("PRJ_RES(EU1)"), c.applied ? 1u : 2u);
+            ASSERT_EQ(GroupSize("PRJ_RES(EU2)"), c.applied ? 1u : 0u);
+            if (c.applied) {
+                EXPECT_EQ(bdr.Groups().Find("PRJ_RES(EU2)")->front()->unitPrice, 8);
+            }
+        }
+    }
 }
 
 } // namespace

@@ -8,6 +8,7 @@
 #include <string>
 #include <vector>
 
+#include "velhost/header_vars.h"
 #include "velhost/resbuf.h"
 
 namespace Acad {
@@ -198,16 +199,6 @@ class AcDbLayerTableRecord : public AcDbObject {
   AcCmColor color() const;
 };
 
-// Defaults of the settings for a drawing whose header leaves them out.
-constexpr short kVelDefaultAunits = 0;
-constexpr double kVelDefaultAngbase = 0.0;
-constexpr bool kVelDefaultAngdir = false;
-constexpr int kVelDefaultOsmode = 37;  // endpoint, centre, intersection
-constexpr bool kVelDefaultAttdia = false;
-constexpr bool kVelDefaultAttreq = true;
-constexpr bool kVelDefaultLimcheck = false;
-constexpr bool kVelDefaultOrthomode = false;
-
 // One drawing. The default constructor makes a new empty drawing (layer "0" current, an
 // empty named-object dictionary); velOpenDrawing fills one from a DXF file.
 class AcDbDatabase {
@@ -217,7 +208,11 @@ class AcDbDatabase {
   AcDbDatabase(const AcDbDatabase&) = delete;
   AcDbDatabase& operator=(const AcDbDatabase&) = delete;
 
-  // Header settings.
+  // Header settings: all of them as velhost/header_vars.h names them, then one by one.
+  // setHeaderSettings sets them all or, when one leaves its range (eInvalidInput) or the
+  // current layer names no layer of the drawing (eKeyNotFound), none.
+  const VelHeaderSettings& headerSettings() const;
+  Acad::ErrorStatus setHeaderSettings(const VelHeaderSettings& settings);
   short aunits() const;
   Acad::ErrorStatus setAunits(short value);
   double angbase() const;

@@ -11,6 +11,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <type_traits>
 
 #include "host/dxf/drawing.hpp"
 #include "velhost/editor.h"
@@ -363,58 +364,86 @@ AcDbDatabase::AcDbDatabase(Tag) {}
 
 AcDbDatabase::~AcDbDatabase() = default;
 
-namespace {
-
-template <class T>
-Acad::ErrorStatus SetSetting(DrawingFile& file, T& field, const T& value)
+const VelHeaderSettings& AcDbDatabase::headerSettings() const
 {
-    if (!(field == value)) {
-        field = value;
-        file.modified = true;
+    return file_->settings;
+}
+
+Acad::ErrorStatus AcDbDatabase::setHeaderSettings(const VelHeaderSettings& wanted)
+{
+    VelHeaderSettings checked = wanted;
+    Acad::ErrorStatus status = Acad::eOk;
+    velWalkHeaderVars(
+        [&](const VelHeaderVar& var, auto& value, const auto& current) {
+            using Field = std::remove_cvref_t<decltype(value)>;
+            if constexpr (std::is_same_v<Field, int>) {
+                if (value < var.min || value > var.max)
+                    status = Acad::eInvalidInput;
+            } else if constexpr (std::is_same_v<Field, std::string>) {
+                // The layer as the table spells it; one the file named without a record stays.
+                if (value == current)
+                    return;
+                const std::size_t record = file_->LayerRecord(value);
+                if (record == SIZE_MAX && status == Acad::eOk)
+                    status = Acad::eKeyNotFound;
+                else if (record != SIZE_MAX)
+                    value = file_->RecordName(record);
+            }
+        },
+        checked, file_->settings);
+    if (status != Acad::eOk)
+        return status;
+    bool changed = false;
+    velWalkHeaderVars([&](const VelHeaderVar&, const auto& a, const auto& b) { changed = changed || a != b; },
+                      checked, file_->settings);
+    if (changed) {
+        file_->settings = std::move(checked);
+        file_->modified = true;
     }
     return Acad::eOk;
 }
 
+namespace {
+
+// One setting changed through the whole-settings check.
+template <class T>
+Acad::ErrorStatus SetOne(AcDbDatabase& db, T VelHeaderSettings::*member, T value)
+{
+    VelHeaderSettings settings = db.headerSettings();
+    settings.*member = value;
+    return db.setHeaderSettings(settings);
+}
+
 }  // namespace
 
-short AcDbDatabase::aunits() const { return file_->settings.aunits; }
-Acad::ErrorStatus AcDbDatabase::setAunits(short value)
-{
-    if (value < 0 || value > 4)
-        return Acad::eInvalidInput;
-    return SetSetting(*file_, file_->settings.aunits, value);
-}
+short AcDbDatabase::aunits() const { return static_cast<short>(file_->settings.aunits); }
+Acad::ErrorStatus AcDbDatabase::setAunits(short value) { return SetOne(*this, &VelHeaderSettings::aunits, int(value)); }
 double AcDbDatabase::angbase() const { return file_->settings.angbase; }
-Acad::ErrorStatus AcDbDatabase::setAngbase(double value) { return SetSetting(*file_, file_->settings.angbase, value); }
+Acad::ErrorStatus AcDbDatabase::setAngbase(double value) { return SetOne(*this, &VelHeaderSettings::angbase, value); }
 bool AcDbDatabase::angdir() const { return file_->settings.angdir; }
-Acad::ErrorStatus AcDbDatabase::setAngdir(bool value) { return SetSetting(*file_, file_->settings.angdir, value); }
+Acad::ErrorStatus AcDbDatabase::setAngdir(bool value) { return SetOne(*this, &VelHeaderSettings::angdir, value); }
 int AcDbDatabase::osmode() const { return file_->settings.osmode; }
-Acad::ErrorStatus AcDbDatabase::setOsmode(int value)
-{
-    if (value < 0 || value > 65535)
-        return Acad::eInvalidInput;
-    return SetSetting(*file_, file_->settings.osmode, value);
-}
+Acad::ErrorStatus AcDbDatabase::setOsmode(int value) { return SetOne(*this, &VelHeaderSettings::osmode, value); }
 AcCmColor AcDbDatabase::cecolor() const
 {
     AcCmColor color;
-    color.setColorIndex(file_->settings.cecolor > 256 ? AcCmColor::kByLayer : file_->settings.cecolor);
+    color.setColorIndex(static_cast<short>(file_->settings.cecolor > 256 ? AcCmColor::kByLayer : file_->settings.cecolor));
     return color;
 }
 Acad::ErrorStatus AcDbDatabase::setCecolor(const AcCmColor& value)
 {
-    return SetSetting(*file_, file_->settings.cecolor, value.colorIndex());
+    return SetOne(*this, &VelHeaderSettings::cecolor, int(value.colorIndex()));
 }
 bool AcDbDatabase::attdia() const { return file_->settings.attdia; }
-Acad::ErrorStatus AcDbDatabase::setAttdia(bool value) { return SetSetting(*file_, file_->settings.attdia, value); }
+Acad::ErrorStatus AcDbDatabase::setAttdia(bool value) { return SetOne(*this, &VelHeaderSettings::attdia, value); }
 bool AcDbDatabase::attreq() const { return file_->settings.attreq; }
-Acad::ErrorStatus AcDbDatabase::setAttreq(bool value) { return SetSetting(*file_, file_->settings.attreq, value); }
+Acad::ErrorStatus AcDbDatabase::setAttreq(bool value) { return SetOne(*this, &VelHeaderSettings::attreq, value); }
 bool AcDbDatabase::limcheck() const { return file_->settings.limcheck; }
-Acad::ErrorStatus AcDbDatabase::setLimcheck(bool value) { return SetSetting(*file_, file_->settings.limcheck, value); }
+Acad::ErrorStatus AcDbDatabase::setLimcheck(bool value) { return SetOne(*this, &VelHeaderSettings::limcheck, value); }
 bool AcDbDatabase::orthomode() const { return file_->settings.orthomode; }
 Acad::ErrorStatus AcDbDatabase::setOrthomode(bool value)
 {
-    return SetSetting(*file_, file_->settings.orthomode, value);
+    return SetOne(*this, &VelHeaderSettings::orthomode, value);
 }
 
 AcDbObjectId AcDbDatabase::clayer() const
@@ -433,7 +462,7 @@ Acad::ErrorStatus AcDbDatabase::setClayer(AcDbObjectId layerId)
     const std::size_t record = file_->FindRecord(layerId.handle());
     if (std::find(file_->layers.begin(), file_->layers.end(), record) == file_->layers.end())
         return Acad::eNotThatKindOfClass;
-    return SetSetting(*file_, file_->settings.clayer, file_->RecordName(record));
+    return SetOne(*this, &VelHeaderSettings::clayer, file_->RecordName(record));
 }
 
 Acad::ErrorStatus AcDbDatabase::getLayerId(const std::string& name, AcDbObjectId& id) const

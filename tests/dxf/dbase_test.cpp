@@ -22,7 +22,7 @@ TEST(AcDbDatabase, NewDrawingHasDefaultsAndLayerZero)
     EXPECT_EQ(db.dxfVersion(), "AC1032");
     EXPECT_EQ(db.fileName(), "");
     EXPECT_EQ(db.aunits(), 0);
-    EXPECT_EQ(db.osmode(), kVelDefaultOsmode);
+    EXPECT_EQ(db.osmode(), VelHeaderSettings{}.osmode);
     EXPECT_TRUE(db.cecolor().isByLayer());
     EXPECT_TRUE(db.attreq());
     EXPECT_EQ(db.layerName(db.clayer()), "0");
@@ -36,6 +36,7 @@ TEST(AcDbDatabase, SettersCheckTheirValues)
     AcDbDatabase db;
     EXPECT_EQ(db.setAunits(5), Acad::eInvalidInput);
     EXPECT_EQ(db.setOsmode(-1), Acad::eInvalidInput);
+    EXPECT_EQ(db.setOsmode(32768), Acad::eInvalidInput);
     AcCmColor color;
     EXPECT_EQ(color.setColorIndex(300), Acad::eInvalidInput);
     EXPECT_EQ(color.setColorIndex(1), Acad::eOk);

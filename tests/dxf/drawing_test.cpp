@@ -90,9 +90,9 @@ TEST(Drawing, HeaderSettingsOfAnOlderFile)
 TEST(Drawing, OmittedHeaderVariablesTakeDefaultsAndAreAddedOnceSet)
 {
     auto db = Open(Fixture("r2018.dxf"));
-    EXPECT_EQ(db->osmode(), kVelDefaultOsmode);
-    EXPECT_EQ(db->attdia(), kVelDefaultAttdia);
-    EXPECT_EQ(db->attreq(), kVelDefaultAttreq);
+    EXPECT_EQ(db->osmode(), VelHeaderSettings{}.osmode);
+    EXPECT_EQ(db->attdia(), VelHeaderSettings{}.attdia);
+    EXPECT_EQ(db->attreq(), VelHeaderSettings{}.attreq);
     EXPECT_TRUE(db->limcheck());
     EXPECT_TRUE(db->orthomode());
     ASSERT_EQ(db->setOsmode(512), Acad::eOk);

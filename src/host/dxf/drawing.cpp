@@ -11,6 +11,7 @@
 #include <algorithm>
 #include <cerrno>
 #include <cstring>
+#include <type_traits>
 
 #include "host/dxf/binary.hpp"
 #include "text/text.hpp"
@@ -409,18 +410,23 @@ bool DrawingFile::ReadHeader(std::string& error)
             error = Fail(t.line + 1, FormatString("%s pour %.*s", expected, static_cast<int>(name.size()), name.data()));
             return false;
         };
-        auto readInt = [&](auto& field, long long low, long long high) {
-            const auto v = ParseInt(t.value);
-            if (!v || *v < low || *v > high)
-                return bad("un entier");
-            field = static_cast<std::remove_reference_t<decltype(field)>>(*v);
-            return true;
-        };
-        auto readBool = [&](bool& field) {
-            const auto v = ParseInt(t.value);
-            if (!v)
-                return bad("un entier");
-            field = *v != 0;
+        // One reading per type of setting; a flag is set by any non-zero integer, as other
+        // readers take it.
+        auto read = [&](const VelHeaderVar& var, auto& field) {
+            using Field = std::remove_reference_t<decltype(field)>;
+            if constexpr (std::is_same_v<Field, std::string>) {
+                field = std::string(t.value);  // decoded below, once the code page is known
+            } else if constexpr (std::is_same_v<Field, double>) {
+                const auto v = ParseReal(t.value);
+                if (!v)
+                    return bad("un nombre réel");
+                field = *v;
+            } else {
+                const auto v = ParseInt(t.value);
+                if (!v || (!std::is_same_v<Field, bool> && (*v < var.min || *v > var.max)))
+                    return bad("un entier");
+                field = static_cast<Field>(*v);
+            }
             return true;
         };
         std::size_t tagStart = r.offset();
@@ -446,29 +452,14 @@ bool DrawingFile::ReadHeader(std::string& error)
                     if (!h)
                         return bad("un identifiant hexadécimal");
                     handseed = *h;
-                } else if (name == "$AUNITS")
-                    ok = readInt(settings.aunits, 0, 4);
-                else if (name == "$ANGBASE") {
-                    const auto v = ParseReal(t.value);
-                    if (!v)
-                        return bad("un nombre réel");
-                    settings.angbase = *v;
-                } else if (name == "$ANGDIR")
-                    ok = readBool(settings.angdir);
-                else if (name == "$OSMODE")
-                    ok = readInt(settings.osmode, 0, 65535);
-                else if (name == "$CECOLOR")
-                    ok = readInt(settings.cecolor, 0, 257);
-                else if (name == "$ATTDIA")
-                    ok = readBool(settings.attdia);
-                else if (name == "$ATTREQ")
-                    ok = readBool(settings.attreq);
-                else if (name == "$LIMCHECK")
-                    ok = readBool(settings.limcheck);
-                else if (name == "$ORTHOMODE")
-                    ok = readBool(settings.orthomode);
-                else if (name == "$CLAYER")
-                    settings.clayer = std::string(t.value);  // decoded below, once the code page is known
+                } else {
+                    velWalkHeaderVars(
+                        [&](const VelHeaderVar& var, auto& field) {
+                            if (ok && name == var.name)
+                                ok = read(var, field);
+                        },
+                        settings);
+                }
                 if (!ok)
                     return false;
             }
@@ -850,54 +841,31 @@ std::string DrawingFile::HeaderValue(std::string_view name, std::uint64_t seed) 
     std::string out;
     if (name == "$HANDSEED")
         AppendTag(out, 5, FormatHandle(seed), eol);
-    else if (name == "$AUNITS")
-        AppendTag(out, 70, std::to_string(settings.aunits), eol);
-    else if (name == "$ANGBASE")
-        AppendTag(out, 50, FormatRealShortest(settings.angbase), eol);
-    else if (name == "$ANGDIR")
-        AppendTag(out, 70, settings.angdir ? "1" : "0", eol);
-    else if (name == "$OSMODE")
-        AppendTag(out, 70, std::to_string(settings.osmode), eol);
-    else if (name == "$CECOLOR")
-        AppendTag(out, 62, std::to_string(settings.cecolor), eol);
-    else if (name == "$ATTDIA")
-        AppendTag(out, 70, settings.attdia ? "1" : "0", eol);
-    else if (name == "$ATTREQ")
-        AppendTag(out, 70, settings.attreq ? "1" : "0", eol);
-    else if (name == "$LIMCHECK")
-        AppendTag(out, 70, settings.limcheck ? "1" : "0", eol);
-    else if (name == "$ORTHOMODE")
-        AppendTag(out, 70, settings.orthomode ? "1" : "0", eol);
-    else if (name == "$CLAYER")
-        AppendTag(out, 8, EncodeText(settings.clayer, encoding), eol);
+    velWalkHeaderVars(
+        [&](const VelHeaderVar& var, const auto& field) {
+            using Field = std::remove_cvref_t<decltype(field)>;
+            if (name != var.name)
+                return;
+            if constexpr (std::is_same_v<Field, std::string>)
+                AppendTag(out, var.code, EncodeText(field, encoding), eol);
+            else if constexpr (std::is_same_v<Field, double>)
+                AppendTag(out, var.code, FormatRealShortest(field), eol);
+            else
+                AppendTag(out, var.code, std::to_string(static_cast<int>(field)), eol);
+        },
+        settings);
     return out;
 }
 
 std::vector<std::string> DrawingFile::ChangedHeaderVars() const
 {
     std::vector<std::string> changed;
-    const Settings& a = settings;
-    const Settings& b = fileSettings;
-    if (a.aunits != b.aunits)
-        changed.push_back("$AUNITS");
-    if (a.angbase != b.angbase)
-        changed.push_back("$ANGBASE");
-    if (a.angdir != b.angdir)
-        changed.push_back("$ANGDIR");
-    if (a.osmode != b.osmode)
-        changed.push_back("$OSMODE");
-    if (a.cecolor != b.cecolor)
-        changed.push_back("$CECOLOR");
-    if (a.attdia != b.attdia)
-        changed.push_back("$ATTDIA");
-    if (a.attreq != b.attreq)
-        changed.push_back("$ATTREQ");
-    if (a.limcheck != b.limcheck)
-        changed.push_back("$LIMCHECK");
-    if (a.orthomode != b.orthomode)
-        changed.push_back("$ORTHOMODE");
-    if (a.clayer != b.clayer)
-        changed.push_back("$CLAYER");
+    velWalkHeaderVars(
+        [&](const VelHeaderVar& var, const auto& now, const auto& read) {
+            if (now != read)
+                changed.push_back(var.name);
+        },
+        settings, fileSettings);
     const bool hasSeed = std::any_of(headerVars.begin(), headerVars.end(),
                                      [](const HeaderVar& v) { return v.name == "$HANDSEED"; });
     // A seed the file left too low is raised only when something is written anyway, so

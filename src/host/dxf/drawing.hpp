@@ -14,6 +14,7 @@
 #include "host/dxf/codepage.hpp"
 #include "host/dxf/objects.hpp"
 #include "velhost/dbase.h"
+#include "velhost/header_vars.h"
 
 namespace vel::dxf {
 
@@ -50,20 +51,6 @@ struct Record {
     Section section = Section::None;
     bool added = false;
     std::string_view type;
-};
-
-// The settings the host reads and restores, with their header names.
-struct Settings {
-    short aunits = kVelDefaultAunits;
-    double angbase = kVelDefaultAngbase;
-    bool angdir = kVelDefaultAngdir;
-    int osmode = kVelDefaultOsmode;
-    short cecolor = AcCmColor::kByLayer;
-    bool attdia = kVelDefaultAttdia;
-    bool attreq = kVelDefaultAttreq;
-    bool limcheck = kVelDefaultLimcheck;
-    bool orthomode = kVelDefaultOrthomode;
-    std::string clayer = "0";
 };
 
 // A header variable as found in the file: its bytes from the 9 tag to the next one.
@@ -121,8 +108,8 @@ public:
     bool wideCodes = true;          // binary group codes of two bytes (R13 and later)
     bool modified = false;
 
-    Settings settings;
-    Settings fileSettings;          // as read, to know what changed
+    VelHeaderSettings settings;
+    VelHeaderSettings fileSettings;  // as read, to know what changed
     std::uint64_t handseed = 1;     // as read
     std::uint64_t nextHandle = 1;   // first handle not used yet; 0 when all are taken
 

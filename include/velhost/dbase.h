@@ -6,6 +6,7 @@
 #include <cstdint>
 #include <memory>
 #include <string>
+#include <unordered_map>
 #include <vector>
 
 #include "velhost/header_vars.h"
@@ -122,7 +123,7 @@ class AcDbObject {
   // Names of the applications that have XData on the object, in file order.
   std::vector<std::string> xDataApplications() const;
 
-  // Internal representation, for the DXF layer.
+  // The object's tags, for the host's own database functions.
   vel::dxf::ObjectBody& body() { return *body_; }
   const vel::dxf::ObjectBody& body() const { return *body_; }
 
@@ -130,11 +131,19 @@ class AcDbObject {
   explicit AcDbObject(const char* dxfName);
   Acad::ErrorStatus assertWriteEnabled() const;
   Acad::ErrorStatus assertReadEnabled() const;
+  // Files a new object in this object's database, owned by this object; it stays open
+  // for write.
+  Acad::ErrorStatus addToDatabase(AcDbObject* newObject);
+  // Notes that the database changed.
+  void noteChange();
 
  private:
   friend class AcDbDatabase;
-  friend class vel::dxf::DrawingFile;
-  std::unique_ptr<vel::dxf::ObjectBody> body_;
+  std::unique_ptr<vel::dxf::ObjectBody> own_;  // until the object joins a drawing
+  vel::dxf::ObjectBody* body_ = nullptr;       // own_, or the drawing's
+  AcDbDatabase* database_ = nullptr;
+  int readers_ = 0;
+  bool writer_ = false;
 };
 
 class AcDbDictionaryIterator;
@@ -262,15 +271,23 @@ class AcDbDatabase {
   // Number of objects, entities and table records included.
   std::size_t objectCount() const;
 
-  // Internal representation, for the DXF layer.
+  // A drawing read from a file (see velOpenDrawing); `fileName` as fileName() gives it.
+  AcDbDatabase(std::unique_ptr<vel::dxf::DrawingFile> file, std::string fileName);
+  // The drawing's DXF form, for the host's own functions.
   vel::dxf::DrawingFile& file() { return *file_; }
   const vel::dxf::DrawingFile& file() const { return *file_; }
 
  private:
-  friend class vel::dxf::DrawingFile;
-  struct Tag {};
-  explicit AcDbDatabase(Tag);
+  friend class AcDbObject;
+  friend bool velSaveDrawing(AcDbDatabase& database, const std::string& path, std::string& error);
+  // The object of a record, made on first use; null when the record is malformed.
+  AcDbObject* objectAt(std::size_t record);
+  Acad::ErrorStatus addObject(AcDbObject* object, AcDbHandle owner);
+
   std::unique_ptr<vel::dxf::DrawingFile> file_;
+  std::unordered_map<std::size_t, std::unique_ptr<AcDbObject>> objects_;  // by record, as opened or added
+  std::string fileName_;
+  bool modified_ = false;
 };
 
 // Opens any object by id, checked against the wanted class.

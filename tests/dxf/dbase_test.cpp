@@ -31,6 +31,30 @@ TEST(AcDbDatabase, NewDrawingHasDefaultsAndLayerZero)
     EXPECT_FALSE(db.isModified());
 }
 
+TEST(AcDbDatabase, NewDrawingsShareNothing)
+{
+    std::string blank, error;
+    {
+        AcDbDatabase first;
+        ASSERT_TRUE(velWriteDrawing(first, blank, error)) << error;
+        AcDbObjectId layer;
+        ASSERT_EQ(first.addLayer("PREMIER", layer), Acad::eOk);
+        ASSERT_EQ(first.setOsmode(33), Acad::eOk);
+        AcDbDictionary* nod = nullptr;
+        ASSERT_EQ(first.getNamedObjectsDictionary(nod, AcDb::kForWrite), Acad::eOk);
+        auto* record = new AcDbXrecord;
+        AcDbObjectId id;
+        ASSERT_EQ(nod->setAt("PREMIER", record, id), Acad::eOk);
+        record->close();
+        nod->close();
+    }
+    AcDbDatabase second;
+    EXPECT_EQ(second.layerNames(), std::vector<std::string>{"0"});
+    std::string text;
+    ASSERT_TRUE(velWriteDrawing(second, text, error)) << error;
+    EXPECT_EQ(text, blank);
+}
+
 TEST(AcDbDatabase, SettersCheckTheirValues)
 {
     AcDbDatabase db;

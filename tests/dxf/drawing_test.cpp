@@ -131,11 +131,16 @@ TEST(Drawing, NewObjectsGetHandlesBelowTheSeedAndTheirApplicationIsRegistered)
         std::string error;
         ASSERT_TRUE(velReadDrawing(text, file, back, error)) << error;
         EXPECT_TRUE(back->isRegApp("NOUVELLE_APP"));
-        const auto& f = back->file();
+        const vel::dxf::Sections& records = back->file().records();
         std::uint64_t highest = 0;
-        for (const auto& r : f.records)
-            highest = std::max(highest, r.handle);
-        EXPECT_GT(f.handseed, highest);
+        for (std::size_t i = 0; i < records.size(); ++i)
+            highest = std::max(highest, records[i].handle);
+        const auto seed = text.find("$HANDSEED");
+        ASSERT_NE(seed, std::string::npos);
+        std::istringstream header(text.substr(seed + 9));
+        std::string code, value;
+        header >> code >> value;
+        EXPECT_GT(std::stoull(value, nullptr, 16), highest);
         AcDbDictionary* nod2 = nullptr;
         ASSERT_EQ(back->getNamedObjectsDictionary(nod2, AcDb::kForRead), Acad::eOk);
         AcDbObject* again = nullptr;

@@ -10,6 +10,7 @@
 #include <vector>
 
 #include "velhost/header_vars.h"
+#include "velhost/read_result.h"
 #include "velhost/resbuf.h"
 
 namespace Acad {
@@ -306,13 +307,12 @@ Acad::ErrorStatus acdbOpenObject(T*& object, AcDbObjectId id, AcDb::OpenMode mod
   return Acad::eOk;
 }
 
-// Reads a DXF drawing (ASCII, R12 to R2018). On failure `out` is untouched and `error`
-// is a French message naming the file, the line and what was expected.
-bool velOpenDrawing(const std::string& path, std::unique_ptr<AcDbDatabase>& out, std::string& error);
+// Reads a DXF drawing (ASCII or binary, R12 to R2018). On failure `out` is untouched and
+// the result names the file, the line (the group of a binary file) and what was expected.
+VelReadResult velOpenDrawing(const std::string& path, std::unique_ptr<AcDbDatabase>& out);
 
 // Same, from a buffer in memory; `name` stands for the file in messages.
-bool velReadDrawing(std::string content, const std::string& name,
-                    std::unique_ptr<AcDbDatabase>& out, std::string& error);
+VelReadResult velReadDrawing(std::string content, const std::string& name, std::unique_ptr<AcDbDatabase>& out);
 
 // Writes the drawing as DXF in its own version (AC1032 for a new drawing): what did not
 // change is written back byte for byte. The file is replaced only once complete.

@@ -47,8 +47,7 @@ AcDbObject* AcDbDatabase::objectAt(std::size_t record)
 Acad::ErrorStatus AcDbDatabase::addObject(AcDbObject* object, AcDbHandle owner)
 {
     std::size_t record = 0;
-    std::string error;
-    if (!object->own_ || !file_->AddObject(object->own_, owner, record, error))
+    if (!object->own_ || !file_->AddObject(object->own_, owner, record))
         return Acad::eNotApplicable;
     object->database_ = this;
     object->writer_ = true;
@@ -194,8 +193,7 @@ Acad::ErrorStatus AcDbDatabase::addLayer(const std::string& name, AcDbObjectId& 
     if (file_->LayerRecord(name) != SIZE_MAX)
         return Acad::eDuplicateKey;
     std::size_t record = 0;
-    std::string error;
-    if (!file_->AddLayer(name, record, error))
+    if (!file_->AddLayer(name, record))
         return Acad::eNotApplicable;
     modified_ = true;
     id = AcDbObjectId(this, file_->HandleOf(record));
@@ -263,8 +261,7 @@ Acad::ErrorStatus AcDbDatabase::addRegApp(const std::string& name)
         return Acad::eInvalidInput;
     if (isRegApp(name))
         return Acad::eDuplicateKey;
-    std::string error;
-    if (!file_->AddApp(name, error))
+    if (!file_->AddApp(name))
         return Acad::eNotApplicable;
     modified_ = true;
     return Acad::eOk;

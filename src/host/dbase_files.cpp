@@ -11,28 +11,33 @@
 
 using vel::dxf::DrawingFile;
 
-bool velOpenDrawing(const std::string& path, std::unique_ptr<AcDbDatabase>& out, std::string& error)
+namespace {
+
+VelReadResult ReadFrom(std::unique_ptr<vel::dxf::Source> source, const std::string& name,
+                       std::unique_ptr<AcDbDatabase>& out)
 {
-    auto source = std::make_unique<vel::dxf::Source>();
-    if (!source->Load(path, error))
-        return false;
-    std::unique_ptr<DrawingFile> file = DrawingFile::Read(std::move(source), path, error);
-    if (!file)
-        return false;
-    out = std::make_unique<AcDbDatabase>(std::move(file), path);
-    return true;
+    std::unique_ptr<DrawingFile> file;
+    VelReadResult result = DrawingFile::Read(std::move(source), name, file);
+    if (result)
+        out = std::make_unique<AcDbDatabase>(std::move(file), name);
+    return result;
 }
 
-bool velReadDrawing(std::string content, const std::string& name, std::unique_ptr<AcDbDatabase>& out,
-                    std::string& error)
+}  // namespace
+
+VelReadResult velOpenDrawing(const std::string& path, std::unique_ptr<AcDbDatabase>& out)
+{
+    auto source = std::make_unique<vel::dxf::Source>();
+    if (VelReadResult loaded = source->Load(path); !loaded)
+        return loaded;
+    return ReadFrom(std::move(source), path, out);
+}
+
+VelReadResult velReadDrawing(std::string content, const std::string& name, std::unique_ptr<AcDbDatabase>& out)
 {
     auto source = std::make_unique<vel::dxf::Source>();
     source->Own(std::move(content));
-    std::unique_ptr<DrawingFile> file = DrawingFile::Read(std::move(source), name, error);
-    if (!file)
-        return false;
-    out = std::make_unique<AcDbDatabase>(std::move(file), name);
-    return true;
+    return ReadFrom(std::move(source), name, out);
 }
 
 bool velWriteDrawing(AcDbDatabase& database, std::string& out, std::string& error)

@@ -11,8 +11,7 @@ namespace {
 std::unique_ptr<AcDbDatabase> OpenFixture(const char* name)
 {
     std::unique_ptr<AcDbDatabase> db;
-    std::string error;
-    EXPECT_TRUE(velOpenDrawing(std::string(VEL_TEST_DATA) + "/dxf/" + name, db, error)) << error;
+    EXPECT_EQ(velOpenDrawing(std::string(VEL_TEST_DATA) + "/dxf/" + name, db).description(), "");
     return db;
 }
 
@@ -266,7 +265,7 @@ TEST(AcDbXrecord, DataRoundTripsThroughTheDrawing)
     std::string error;
     ASSERT_TRUE(velWriteDrawing(db, text, error)) << error;
     std::unique_ptr<AcDbDatabase> back;
-    ASSERT_TRUE(velReadDrawing(text, "neuf.dxf", back, error)) << error;
+    ASSERT_EQ(velReadDrawing(text, "neuf.dxf", back).description(), "");
     AcDbXrecord* again = nullptr;
     ASSERT_EQ(acdbOpenObject(again, back->idFromHandle(id.handle()), AcDb::kForRead), Acad::eOk);
     resbuf* chain = nullptr;

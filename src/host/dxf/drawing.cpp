@@ -12,27 +12,25 @@ namespace vel::dxf {
 
 DrawingFile::~DrawingFile() = default;
 
-std::unique_ptr<DrawingFile> DrawingFile::Read(std::unique_ptr<Source> source, const std::string& name,
-                                               std::string& error)
+VelReadResult DrawingFile::Read(std::unique_ptr<Source> source, const std::string& name,
+                                std::unique_ptr<DrawingFile>& out)
 {
     std::unique_ptr<DrawingFile> file(new DrawingFile);
     file->name_ = name;
     if (IsBinaryDxf(source->view())) {
+        file->binary_ = true;
         std::string text;
         std::uint64_t group = 0;
         std::string expected;
-        if (!BinaryToText(source->view(), text, file->wideCodes_, group, expected)) {
-            error = FormatString("« %s » (DXF binaire), groupe %llu : il fallait %s", name.c_str(),
-                                 static_cast<unsigned long long>(group), expected.c_str());
-            return nullptr;
-        }
-        file->binary_ = true;
+        if (!BinaryToText(source->view(), text, file->wideCodes_, group, expected))
+            return file->FailAtGroup(group, expected);
         source = std::make_unique<Source>();
         source->Own(std::move(text));
     }
-    if (!file->Load(std::move(source), error))
-        return nullptr;
-    return file;
+    VelReadResult result = file->Load(std::move(source));
+    if (result)
+        out = std::move(file);
+    return result;
 }
 
 std::unique_ptr<DrawingFile> DrawingFile::Copy() const
@@ -50,7 +48,7 @@ std::unique_ptr<DrawingFile> DrawingFile::Copy() const
     return copy;
 }
 
-bool DrawingFile::Load(std::shared_ptr<const Source> source, std::string& error)
+VelReadResult DrawingFile::Load(std::shared_ptr<const Source> source)
 {
     source_ = std::move(source);
     const std::string_view text = source_->view();
@@ -65,32 +63,28 @@ bool DrawingFile::Load(std::shared_ptr<const Source> source, std::string& error)
             ok = false;
         }
     }
-    if (!ok) {
-        error = Fail(pe.line, pe.expected);
-        return false;
-    }
     sourceCount_ = sections_.size();
     bodies_.resize(sourceCount_);
-    if (!handles_.Index(sections_, header_.handseed(), pe)) {
-        error = Fail(pe.line, pe.expected);
-        return false;
-    }
-    return CheckDictionaries(error);
+    ok = ok && handles_.Index(sections_, header_.handseed(), pe) && CheckDictionaries(pe);
+    return ok ? VelReadResult{} : Fail(pe.line, pe.expected);
 }
 
-std::string DrawingFile::Where(std::uint32_t line) const
+VelReadResult DrawingFile::Fail(std::uint32_t line, const std::string& expected) const
 {
+    // The text form of a binary drawing has two lines per group.
     if (binary_)
-        return FormatString("« %s » (DXF binaire), groupe %u", name_.c_str(), (line + 1) / 2);
-    return FormatString("« %s », ligne %u", name_.c_str(), line);
+        return FailAtGroup((line + 1) / 2, expected);
+    return VelReadResult::Malformed(name_, line, expected);
 }
 
-std::string DrawingFile::Fail(std::uint32_t line, const std::string& expected) const
+VelReadResult DrawingFile::FailAtGroup(std::uint64_t group, const std::string& expected) const
 {
-    return Where(line) + " : il fallait " + expected;
+    return VelReadResult::Malformed(name_, static_cast<std::int64_t>(group), expected,
+                                    FormatString("« %s » (DXF binaire), groupe %llu : il fallait %s", name_.c_str(),
+                                                 static_cast<unsigned long long>(group), expected.c_str()));
 }
 
-bool DrawingFile::CheckDictionaries(std::string& error)
+bool DrawingFile::CheckDictionaries(ParseError& error)
 {
     std::vector<std::size_t> dictionaries;
     for (std::size_t i = 0; i < sections_.size(); ++i)
@@ -102,18 +96,15 @@ bool DrawingFile::CheckDictionaries(std::string& error)
     eager.insert(eager.end(), sections_.layers().begin(), sections_.layers().end());
     eager.insert(eager.end(), sections_.apps().begin(), sections_.apps().end());
     for (std::size_t i : eager) {
-        ParseError pe;
-        if (!Body(i, &pe)) {
-            error = Fail(pe.line, pe.expected);
+        if (!Body(i, &error))
             return false;
-        }
     }
     for (std::size_t i : dictionaries)
         for (const auto& e : bodies_[i]->entries)
             if (e.handle == 0 || handles_.FindInFile(e.handle) == SIZE_MAX) {
-                error = Fail(e.line, FormatString("une entrée vers un objet du dessin (l'identifiant %s de « %s » "
-                                                  "n'existe pas)",
-                                                  FormatHandle(e.handle).c_str(), e.key.c_str()));
+                error = {e.line, FormatString("une entrée vers un objet du dessin (l'identifiant %s de « %s » "
+                                              "n'existe pas)",
+                                              FormatHandle(e.handle).c_str(), e.key.c_str())};
                 return false;
             }
     // Depth-first walk over dictionary entries: 1 on the path, 2 done.
@@ -140,9 +131,9 @@ bool DrawingFile::CheckDictionaries(std::string& error)
             if (!IsDictionaryType(sections_[child].type))
                 continue;
             if (state[child] == 1) {
-                error = Fail(e.line, FormatString("une entrée qui ne remonte pas à un dictionnaire parent (« %s » "
-                                                  "ramène au dictionnaire de la ligne %u)",
-                                                  e.key.c_str(), sections_[child].line));
+                error = {e.line, FormatString("une entrée qui ne remonte pas à un dictionnaire parent (« %s » "
+                                              "ramène au dictionnaire de la ligne %u)",
+                                              e.key.c_str(), sections_[child].line)};
                 return false;
             }
             if (state[child] == 0) {
@@ -207,17 +198,11 @@ bool DrawingFile::AddRecord(std::unique_ptr<ObjectBody>&& body, std::size_t befo
     return true;
 }
 
-bool DrawingFile::AddObject(std::unique_ptr<ObjectBody>& body, std::uint64_t owner, std::size_t& record,
-                            std::string& error)
+bool DrawingFile::AddObject(std::unique_ptr<ObjectBody>& body, std::uint64_t owner, std::size_t& record)
 {
-    if (sections_.objectsEnd() == SIZE_MAX) {
-        error = FormatString("un dessin %s ne peut pas contenir d'objets non graphiques", acadver().c_str());
+    // An R12 drawing has no OBJECTS section to hold it.
+    if (sections_.objectsEnd() == SIZE_MAX || handles_.next() == 0)
         return false;
-    }
-    if (handles_.next() == 0) {
-        error = "le dessin n'a plus d'identifiant libre";
-        return false;
-    }
     return AddRecord(std::move(body), sections_.objectsEnd(), Section::Objects, owner, true, record);
 }
 
@@ -259,13 +244,11 @@ std::unique_ptr<ObjectBody> NewTableRecord(const char* type, const char* subclas
 
 }  // namespace
 
-bool DrawingFile::AddLayer(const std::string& name, std::size_t& record, std::string& error)
+bool DrawingFile::AddLayer(const std::string& name, std::size_t& record)
 {
     const std::size_t end = sections_.TableEnd("LAYER");
-    if (end == SIZE_MAX) {
-        error = "le dessin n'a pas de table des calques";
+    if (end == SIZE_MAX)
         return false;
-    }
     const bool r12 = acadver() <= "AC1009";
     auto body = NewTableRecord("LAYER", "AcDbLayerTableRecord", r12);
     body->tags.push_back({2, 0, body->keep(EncodeText(name, encoding()))});
@@ -273,31 +256,25 @@ bool DrawingFile::AddLayer(const std::string& name, std::size_t& record, std::st
     body->tags.push_back({62, 0, "7"});
     body->tags.push_back({6, 0, r12 ? "CONTINUOUS" : "Continuous"});
     body->entryPos = body->tags.size();
-    if (!AddRecord(std::move(body), end, Section::Tables, sections_.TableHandle("LAYER"), !r12, record)) {
-        error = "le dessin n'a plus d'identifiant libre";
+    if (!AddRecord(std::move(body), end, Section::Tables, sections_.TableHandle("LAYER"), !r12, record))
         return false;
-    }
     sections_.AddLayer(record);
     return true;
 }
 
-bool DrawingFile::AddApp(const std::string& name, std::string& error)
+bool DrawingFile::AddApp(const std::string& name)
 {
     const std::size_t end = sections_.TableEnd("APPID");
-    if (end == SIZE_MAX) {
-        error = "le dessin n'a pas de table des applications";
+    if (end == SIZE_MAX)
         return false;
-    }
     const bool r12 = acadver() <= "AC1009";
     auto body = NewTableRecord("APPID", "AcDbRegAppTableRecord", r12);
     body->tags.push_back({2, 0, body->keep(EncodeText(name, encoding()))});
     body->tags.push_back({70, 0, "0"});
     body->entryPos = body->tags.size();
     std::size_t record = 0;
-    if (!AddRecord(std::move(body), end, Section::Tables, sections_.TableHandle("APPID"), !r12, record)) {
-        error = "le dessin n'a plus d'identifiant libre";
+    if (!AddRecord(std::move(body), end, Section::Tables, sections_.TableHandle("APPID"), !r12, record))
         return false;
-    }
     sections_.AddApp(record);
     return true;
 }

@@ -18,6 +18,7 @@
 #include "host/dxf/source.hpp"
 #include "host/dxf/writer.hpp"
 #include "velhost/header_vars.h"
+#include "velhost/read_result.h"
 
 namespace vel::dxf {
 
@@ -27,10 +28,10 @@ public:
     DrawingFile(const DrawingFile&) = delete;
     DrawingFile& operator=(const DrawingFile&) = delete;
 
-    // Reads a drawing (ASCII or binary DXF); `name` stands for the file in messages.
-    // Null with `error` set when any part of it is malformed.
-    static std::unique_ptr<DrawingFile> Read(std::unique_ptr<Source> source, const std::string& name,
-                                             std::string& error);
+    // Reads a drawing (ASCII or binary DXF) into `out`, left alone unless the whole file
+    // is sound; `name` stands for the file in messages.
+    static VelReadResult Read(std::unique_ptr<Source> source, const std::string& name,
+                              std::unique_ptr<DrawingFile>& out);
     // A new empty drawing (layer "0" current, an empty named-object dictionary): a copy
     // of the built-in template, read once. Should the template be unreadable, a drawing
     // with no section at all.
@@ -49,19 +50,19 @@ public:
     // Handle of a record (see Handles::Of).
     std::uint64_t HandleOf(std::size_t record) { return handles_.Of(sections_, record); }
     // Adds an object to the OBJECTS section with a new handle and its owner; `body` is
-    // taken only on success. False with `error` when the drawing cannot hold it (R12, or
-    // no handle left).
-    bool AddObject(std::unique_ptr<ObjectBody>& body, std::uint64_t owner, std::size_t& record, std::string& error);
+    // taken only on success. False when the drawing cannot hold it (R12, or no handle
+    // left).
+    bool AddObject(std::unique_ptr<ObjectBody>& body, std::uint64_t owner, std::size_t& record);
 
     // Layers and applications by name, without regard to case; SIZE_MAX when absent.
     std::size_t LayerRecord(const std::string& name);
     std::size_t AppRecord(const std::string& name);
     // Name (UTF-8) of a table record.
     std::string RecordName(std::size_t record);
-    // New layer (colour 7, continuous) and application; false with `error` when the
-    // drawing has no such table or no handle left.
-    bool AddLayer(const std::string& name, std::size_t& record, std::string& error);
-    bool AddApp(const std::string& name, std::string& error);
+    // New layer (colour 7, continuous) and application; false when the drawing has no
+    // such table or no handle left.
+    bool AddLayer(const std::string& name, std::size_t& record);
+    bool AddApp(const std::string& name);
 
     const VelHeaderSettings& settings() const { return header_.settings(); }
     VelHeaderSettings& settings() { return header_.settings(); }
@@ -75,10 +76,12 @@ private:
     // A copy of a drawing nothing was added to: the bytes are shared, the objects read
     // again from them on use.
     std::unique_ptr<DrawingFile> Copy() const;
-    bool Load(std::shared_ptr<const Source> source, std::string& error);
-    bool CheckDictionaries(std::string& error);
-    std::string Where(std::uint32_t line) const;
-    std::string Fail(std::uint32_t line, const std::string& expected) const;
+    VelReadResult Load(std::shared_ptr<const Source> source);
+    bool CheckDictionaries(ParseError& error);
+    // The refusal of the file at a line of its text form, or at a group of the binary
+    // file it came from.
+    VelReadResult Fail(std::uint32_t line, const std::string& expected) const;
+    VelReadResult FailAtGroup(std::uint64_t group, const std::string& expected) const;
     bool AddRecord(std::unique_ptr<ObjectBody>&& body, std::size_t before, Section section, std::uint64_t owner,
                    bool withHandle, std::size_t& record);
     std::vector<std::string> ChangedHeaderVars() const;

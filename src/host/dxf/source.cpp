@@ -10,7 +10,6 @@
 #include <cerrno>
 #include <cstring>
 
-#include "text/text.hpp"
 
 namespace vel::dxf {
 
@@ -20,23 +19,21 @@ Source::~Source()
         munmap(buffer_, capacity_);
 }
 
-bool Source::Load(const std::string& path, std::string& error)
+VelReadResult Source::Load(const std::string& path)
 {
     const int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC);
     if (fd < 0) {
-        error = FormatString("« %s » : impossible d'ouvrir le fichier (%s)", path.c_str(), std::strerror(errno));
-        return false;
+        const int err = errno;
+        return VelReadResult::Failed(err == ENOENT ? VelReadStatus::kNotFound : VelReadStatus::kCannotOpen, path, err);
     }
     struct stat st {};
     if (fstat(fd, &st) != 0 || !S_ISREG(st.st_mode)) {
-        error = FormatString("« %s » : ce n'est pas un fichier ordinaire", path.c_str());
         close(fd);
-        return false;
+        return VelReadResult::Failed(VelReadStatus::kNotAFile, path);
     }
     const auto fail = [&](int err) {
-        error = FormatString("« %s » : lecture impossible (%s)", path.c_str(), std::strerror(err));
         close(fd);
-        return false;
+        return VelReadResult::Failed(VelReadStatus::kCannotRead, path, err);
     };
     // Memory of its own rather than the heap: in large pages where the system has them,
     // filling it costs no more than mapping the file did.
@@ -77,7 +74,7 @@ bool Source::Load(const std::string& path, std::string& error)
     capacity_ = capacity;
     data_ = static_cast<const char*>(buffer);
     size_ = size;
-    return true;
+    return {};
 }
 
 void Source::Own(std::string content)

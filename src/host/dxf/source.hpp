@@ -6,6 +6,8 @@
 #include <string>
 #include <string_view>
 
+#include "velhost/read_result.h"
+
 namespace vel::dxf {
 
 // Bytes of a drawing: a read-only copy of the file, or a string.
@@ -18,7 +20,7 @@ public:
     // Reads the whole file into memory: a mapping of the file would fault on every page
     // that another program cut off it while it is open, and the writer copies from it at
     // save.
-    bool Load(const std::string& path, std::string& error);
+    VelReadResult Load(const std::string& path);
     void Own(std::string content);
     std::string_view view() const { return {data_, size_}; }
 

@@ -856,14 +856,13 @@ std::unique_ptr<DrawingFile> DrawingFile::New()
     static const std::unique_ptr<const DrawingFile> kTemplate = [] {
         auto source = std::make_unique<Source>();
         source->Own(std::string(NewDrawingDxf()));
-        std::string error;
-        std::unique_ptr<DrawingFile> file = Read(std::move(source), "", error);
-        if (!file) {
+        std::unique_ptr<DrawingFile> file;
+        if (!Read(std::move(source), "", file)) {
             // Never for the text above (a test reads it); a drawing with no section
             // still lets the host run.
             source = std::make_unique<Source>();
             source->Own("  0\nEOF\n");
-            file = Read(std::move(source), "", error);
+            Read(std::move(source), "", file);
         }
         return file;
     }();

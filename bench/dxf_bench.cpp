@@ -42,9 +42,8 @@ void BM_VelRead(benchmark::State& state)
     for (auto _ : state) {
         const double before = ResidentBytes();
         std::unique_ptr<AcDbDatabase> db;
-        std::string error;
-        if (!velOpenDrawing(kFile, db, error)) {
-            state.SkipWithError(error.c_str());
+        if (const VelReadResult read = velOpenDrawing(kFile, db); !read) {
+            state.SkipWithError(read.description().c_str());
             return;
         }
         // What the quantity take-off reads: every project record of the networks.
@@ -79,9 +78,8 @@ BENCHMARK(BM_VelRead)->Unit(benchmark::kMillisecond)->MinTime(2.0)->UseRealTime(
 void BM_VelWrite(benchmark::State& state)
 {
     std::unique_ptr<AcDbDatabase> db;
-    std::string error;
-    if (!velOpenDrawing(kFile, db, error)) {
-        state.SkipWithError(error.c_str());
+    if (const VelReadResult read = velOpenDrawing(kFile, db); !read) {
+        state.SkipWithError(read.description().c_str());
         return;
     }
     // One changed record and one changed setting, so that the writer does real work.
@@ -97,6 +95,7 @@ void BM_VelWrite(benchmark::State& state)
     record->close();
     nod->close();
     const std::string out = kFile + ".copie.dxf";
+    std::string error;
     for (auto _ : state) {
         if (!velSaveDrawing(*db, out, error)) {
             state.SkipWithError(error.c_str());

@@ -40,12 +40,13 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
 {
     const std::string input(reinterpret_cast<const char*>(data), size);
     std::unique_ptr<AcDbDatabase> db;
-    std::string error;
-    if (!velReadDrawing(input, "fuzz.dxf", db, error)) {
-        if (error.rfind("« fuzz.dxf »", 0) != 0)
-            Fault("message sans nom de fichier");
+    if (const VelReadResult read = velReadDrawing(input, "fuzz.dxf", db); !read) {
+        if (read.status != VelReadStatus::kMalformed || read.file != "fuzz.dxf" ||
+            read.description().rfind("« fuzz.dxf »", 0) != 0)
+            Fault("refus sans nom de fichier");
         return 0;
     }
+    std::string error;
     Walk(*db, db->namedObjectsDictionaryId(), 0);
     db->layerNames();
     std::string out;
@@ -73,8 +74,8 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     if (!velWriteDrawing(*db, out, error))
         Fault("écriture après modification refusée");
     std::unique_ptr<AcDbDatabase> again;
-    if (!velReadDrawing(out, "fuzz2.dxf", again, error))
-        Fault(("relecture refusée : " + error).c_str());
+    if (const VelReadResult read = velReadDrawing(out, "fuzz2.dxf", again); !read)
+        Fault(("relecture refusée : " + read.description()).c_str());
     if (again->osmode() != 3)
         Fault("réglage perdu");
     return 0;

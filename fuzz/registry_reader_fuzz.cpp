@@ -21,16 +21,16 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
 {
     const std::string text(reinterpret_cast<const char*>(data), size);
     std::vector<VelRegistryKey> keys;
-    std::string error;
-    if (!velParseRegistry(text, "registre.reg", keys, error)) {
-        if (error.rfind("registre.reg, ligne ", 0) != 0)
-            Fault("message sans fichier ni ligne : " + error);
+    if (const VelReadResult read = velParseRegistry(text, "registre.reg", keys); !read) {
+        if (read.status != VelReadStatus::kMalformed || read.line < 1 ||
+            read.description().rfind("registre.reg, ligne " + std::to_string(read.line) + " : ", 0) != 0)
+            Fault("refus sans fichier ni ligne : " + read.description());
         return 0;
     }
     const std::string written = velSerializeRegistry(keys);
     std::vector<VelRegistryKey> back;
-    if (!velParseRegistry(written, "registre.reg", back, error))
-        Fault("relecture refusée : " + error);
+    if (const VelReadResult read = velParseRegistry(written, "registre.reg", back); !read)
+        Fault("relecture refusée : " + read.description());
     if (back.size() != keys.size())
         Fault("nombre de clés différent à la relecture");
     for (std::size_t i = 0; i < keys.size(); ++i)

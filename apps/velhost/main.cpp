@@ -198,8 +198,8 @@ int main(int argc, char** argv) {
     std::_Exit(3);
   });
 
-  std::string registryError;
-  if (!velCheckRegistry(registryError)) acutPrintf("%s\n", registryError.c_str());
+  if (const VelReadResult registry = velCheckRegistry(); !registry)
+    acutPrintf("%s\n", registry.description().c_str());
 
   VelShell shell;
   int status = 0;

@@ -180,7 +180,10 @@ bool VelShell::openDrawing(const std::string& path, std::string& error) {
       return true;
     }
   std::unique_ptr<AcDbDatabase> database;
-  if (!velOpenDrawing(full, database, error)) return false;
+  if (const VelReadResult read = velOpenDrawing(full, database); !read) {
+    error = read.description();
+    return false;
+  }
   acDocManagerPtr()->createDocument(std::move(database), full);
   acutPrintf("Dessin %s ouvert.\n", full.c_str());
   return true;
@@ -288,6 +291,12 @@ int VelShell::run() {
       }
       acutPrintf("%s\n", error.c_str());
     }
+  }
+  // A script cut short by an input error did not run to its end.
+  if (script != nullptr && status == 0 && !script->readResult()) {
+    std::fflush(stdout);
+    std::fprintf(stderr, "velhost: %s\n", script->readResult().description().c_str());
+    status = 1;
   }
   shutdown();
   return status;

@@ -6,8 +6,11 @@
 #include <cstdint>
 #include <memory>
 #include <string>
+#include <unordered_map>
 #include <vector>
 
+#include "velhost/header_vars.h"
+#include "velhost/read_result.h"
 #include "velhost/resbuf.h"
 
 namespace Acad {
@@ -121,7 +124,7 @@ class AcDbObject {
   // Names of the applications that have XData on the object, in file order.
   std::vector<std::string> xDataApplications() const;
 
-  // Internal representation, for the DXF layer.
+  // The object's tags, for the host's own database functions.
   vel::dxf::ObjectBody& body() { return *body_; }
   const vel::dxf::ObjectBody& body() const { return *body_; }
 
@@ -129,11 +132,19 @@ class AcDbObject {
   explicit AcDbObject(const char* dxfName);
   Acad::ErrorStatus assertWriteEnabled() const;
   Acad::ErrorStatus assertReadEnabled() const;
+  // Files a new object in this object's database, owned by this object; it stays open
+  // for write.
+  Acad::ErrorStatus addToDatabase(AcDbObject* newObject);
+  // Notes that the database changed.
+  void noteChange();
 
  private:
   friend class AcDbDatabase;
-  friend class vel::dxf::DrawingFile;
-  std::unique_ptr<vel::dxf::ObjectBody> body_;
+  std::unique_ptr<vel::dxf::ObjectBody> own_;  // until the object joins a drawing
+  vel::dxf::ObjectBody* body_ = nullptr;       // own_, or the drawing's
+  AcDbDatabase* database_ = nullptr;
+  int readers_ = 0;
+  bool writer_ = false;
 };
 
 class AcDbDictionaryIterator;
@@ -198,16 +209,6 @@ class AcDbLayerTableRecord : public AcDbObject {
   AcCmColor color() const;
 };
 
-// Defaults of the settings for a drawing whose header leaves them out.
-constexpr short kVelDefaultAunits = 0;
-constexpr double kVelDefaultAngbase = 0.0;
-constexpr bool kVelDefaultAngdir = false;
-constexpr int kVelDefaultOsmode = 37;  // endpoint, centre, intersection
-constexpr bool kVelDefaultAttdia = false;
-constexpr bool kVelDefaultAttreq = true;
-constexpr bool kVelDefaultLimcheck = false;
-constexpr bool kVelDefaultOrthomode = false;
-
 // One drawing. The default constructor makes a new empty drawing (layer "0" current, an
 // empty named-object dictionary); velOpenDrawing fills one from a DXF file.
 class AcDbDatabase {
@@ -217,7 +218,11 @@ class AcDbDatabase {
   AcDbDatabase(const AcDbDatabase&) = delete;
   AcDbDatabase& operator=(const AcDbDatabase&) = delete;
 
-  // Header settings.
+  // Header settings: all of them as velhost/header_vars.h names them, then one by one.
+  // setHeaderSettings sets them all or, when one leaves its range (eInvalidInput) or the
+  // current layer names no layer of the drawing (eKeyNotFound), none.
+  const VelHeaderSettings& headerSettings() const;
+  Acad::ErrorStatus setHeaderSettings(const VelHeaderSettings& settings);
   short aunits() const;
   Acad::ErrorStatus setAunits(short value);
   double angbase() const;
@@ -267,15 +272,23 @@ class AcDbDatabase {
   // Number of objects, entities and table records included.
   std::size_t objectCount() const;
 
-  // Internal representation, for the DXF layer.
+  // A drawing read from a file (see velOpenDrawing); `fileName` as fileName() gives it.
+  AcDbDatabase(std::unique_ptr<vel::dxf::DrawingFile> file, std::string fileName);
+  // The drawing's DXF form, for the host's own functions.
   vel::dxf::DrawingFile& file() { return *file_; }
   const vel::dxf::DrawingFile& file() const { return *file_; }
 
  private:
-  friend class vel::dxf::DrawingFile;
-  struct Tag {};
-  explicit AcDbDatabase(Tag);
+  friend class AcDbObject;
+  friend bool velSaveDrawing(AcDbDatabase& database, const std::string& path, std::string& error);
+  // The object of a record, made on first use; null when the record is malformed.
+  AcDbObject* objectAt(std::size_t record);
+  Acad::ErrorStatus addObject(AcDbObject* object, AcDbHandle owner);
+
   std::unique_ptr<vel::dxf::DrawingFile> file_;
+  std::unordered_map<std::size_t, std::unique_ptr<AcDbObject>> objects_;  // by record, as opened or added
+  std::string fileName_;
+  bool modified_ = false;
 };
 
 // Opens any object by id, checked against the wanted class.
@@ -294,13 +307,12 @@ Acad::ErrorStatus acdbOpenObject(T*& object, AcDbObjectId id, AcDb::OpenMode mod
   return Acad::eOk;
 }
 
-// Reads a DXF drawing (ASCII, R12 to R2018). On failure `out` is untouched and `error`
-// is a French message naming the file, the line and what was expected.
-bool velOpenDrawing(const std::string& path, std::unique_ptr<AcDbDatabase>& out, std::string& error);
+// Reads a DXF drawing (ASCII or binary, R12 to R2018). On failure `out` is untouched and
+// the result names the file, the line (the group of a binary file) and what was expected.
+VelReadResult velOpenDrawing(const std::string& path, std::unique_ptr<AcDbDatabase>& out);
 
 // Same, from a buffer in memory; `name` stands for the file in messages.
-bool velReadDrawing(std::string content, const std::string& name,
-                    std::unique_ptr<AcDbDatabase>& out, std::string& error);
+VelReadResult velReadDrawing(std::string content, const std::string& name, std::unique_ptr<AcDbDatabase>& out);
 
 // Writes the drawing as DXF in its own version (AC1032 for a new drawing): what did not
 // change is written back byte for byte. The file is replaced only once complete.

@@ -5,6 +5,8 @@
 #include <string>
 #include <string_view>
 
+#include "velhost/read_result.h"
+
 #pragma GCC visibility push(default)
 
 struct VelHostSettings {
@@ -45,9 +47,9 @@ bool velRegQueryValue(std::string_view root, std::string_view keyPath,
 // Creates the key when it does not exist and sets the value (text).
 bool velRegSetValue(std::string_view root, std::string_view keyPath,
                     std::string_view valueName, std::string_view value);
-// Path of the registry file, and a check of it: false with a French message naming the
-// file and line when it cannot be read.
+// Path of the registry file, and a check of it: a refusal names the file and, for a
+// malformed file, the line.
 std::string velRegistryFile();
-bool velCheckRegistry(std::string& error);
+VelReadResult velCheckRegistry();
 
 #pragma GCC visibility pop

@@ -10,6 +10,8 @@
 #include <string>
 #include <vector>
 
+#include "velhost/read_result.h"
+
 #pragma GCC visibility push(default)
 
 // Message box styles and answers, with the values the module passes and expects.
@@ -152,6 +154,8 @@ class VelScriptedUI : public VelUserInterface {
   // Line number of the last line read (0 before the first).
   int currentLine() const { return line_; }
   const std::string& scriptName() const { return name_; }
+  // How the reading went: a failure when an input error ended the script before its end.
+  const VelReadResult& readResult() const { return read_; }
 
  protected:
   std::optional<VelInputLine> readRawLine(const std::string& prompt) override;
@@ -161,6 +165,7 @@ class VelScriptedUI : public VelUserInterface {
   std::ostream& out_;
   std::string name_;
   int line_ = 0;
+  VelReadResult read_;
 };
 
 // The script line without its comment, or nullopt for a line that is only a comment.

@@ -82,32 +82,31 @@ std::vector<VelEntity> velReadEntities(AcDbDatabase& database, std::size_t* skip
     DrawingFile& file = database.file();
     // The entity that VERTEX or ATTRIB records join until its SEQEND.
     std::size_t parent = SIZE_MAX;
-    for (std::size_t record = 0; record < file.records.size(); ++record) {
-        if (file.records[record].section != Section::Entities)
+    for (std::size_t record = 0; record < file.records().size(); ++record) {
+        if (file.records()[record].section != Section::Entities)
             continue;
-        const std::string_view type = file.records[record].type;
+        const std::string_view type = file.records()[record].type;
         if (type == "SECTION" || type == "ENDSEC")
             continue;
         if (type == "SEQEND") {
             parent = SIZE_MAX;
             continue;
         }
-        const AcDbObject* object = file.ObjectAt(record);
-        if (object == nullptr) {
+        const ObjectBody* body = file.Body(record);
+        if (body == nullptr) {
             ++bad;
             continue;
         }
-        const ObjectBody& body = object->body();
         if (type == "VERTEX" || type == "ATTRIB") {
             if (parent != SIZE_MAX)
-                entities[parent].children.push_back(ValuesOf(body, file.encoding));
+                entities[parent].children.push_back(ValuesOf(*body, file.encoding()));
             continue;
         }
         VelEntity entity;
-        entity.dxfName = body.type;
-        entity.handle = body.handle;
-        entity.id = AcDbObjectId(&database, body.handle);
-        entity.values = ValuesOf(body, file.encoding);
+        entity.dxfName = body->type;
+        entity.handle = body->handle;
+        entity.id = AcDbObjectId(&database, body->handle);
+        entity.values = ValuesOf(*body, file.encoding());
         const std::string* layer = FirstText(entity.values, 8);
         entity.layer = layer != nullptr ? *layer : "0";
         const auto space = velDxfReal(entity.values, 67);

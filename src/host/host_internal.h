@@ -7,6 +7,8 @@
 #include <utility>
 #include <vector>
 
+#include "velhost/read_result.h"
+
 // The module whose code runs (its appId), null for the host itself.
 void* velCurrentApp();
 
@@ -50,12 +52,12 @@ std::string velIniValue(const std::string& content, std::string_view section, st
 bool velIniNamesValid(const char* section, const char* key, const char* value);
 bool velIniSetValue(std::string& content, const char* section, const char* key, const char* value);
 
-// The registry file's text apart from the file: its keys with their values, read (false
-// with a French message naming the file and the line) and written back.
+// The registry file's text apart from the file: its keys with their values, read (a
+// refusal names the file and the line) and written back.
 struct VelRegistryKey {
   std::string path;  // ROOT\a\b, as first written
   std::vector<std::pair<std::string, std::string>> values;
 };
-bool velParseRegistry(const std::string& text, const std::string& fileName, std::vector<VelRegistryKey>& keys,
-                      std::string& error);
+VelReadResult velParseRegistry(const std::string& text, const std::string& fileName,
+                               std::vector<VelRegistryKey>& keys);
 std::string velSerializeRegistry(const std::vector<VelRegistryKey>& keys);

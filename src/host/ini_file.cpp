@@ -22,13 +22,17 @@ std::string_view Trim(std::string_view t) {
   return t.substr(first, last - first + 1);
 }
 
-bool ReadWhole(const std::string& fileName, std::string& content) {
+VelReadResult ReadWhole(const std::string& fileName, std::string& content) {
   std::ifstream in(fileName, std::ios::binary);
-  if (!in) return false;
+  if (!in) {
+    const int err = errno;
+    return VelReadResult::Failed(err == ENOENT ? VelReadStatus::kNotFound : VelReadStatus::kCannotOpen, fileName, err);
+  }
   std::ostringstream buffer;
   buffer << in.rdbuf();
+  if (in.bad()) return VelReadResult::Failed(VelReadStatus::kCannotRead, fileName, errno != 0 ? errno : EIO);
   content = buffer.str();
-  return !in.bad();
+  return {};
 }
 
 // Lines without their "\n" (a "\r" stays, so that the file's line ends survive).
@@ -192,9 +196,13 @@ bool velWritePrivateProfileString(const char* section, const char* key, const ch
   }
   std::string content;
   std::error_code ec;
-  if (fs::exists(fileName, ec) && !ReadWhole(fileName, content)) {
-    if (errno == 0) errno = EACCES;
-    return false;
+  if (fs::exists(fileName, ec)) {
+    // A file that exists but does not read is left alone rather than replaced by the
+    // one key.
+    if (const VelReadResult read = ReadWhole(fileName, content); !read) {
+      errno = read.error != 0 ? read.error : EACCES;
+      return false;
+    }
   }
   if (!velIniSetValue(content, section, key, value)) return true;
   return velReplaceFile(fileName, content);

@@ -65,18 +65,17 @@ bool ReadQuoted(const std::string& line, std::size_t& pos, std::string& out) {
   return false;
 }
 
-bool Load(std::vector<Key>& keys, std::string& error) {
+VelReadResult Load(std::vector<Key>& keys) {
   const std::string file = velRegistryFile();
   std::error_code ec;
-  if (!fs::exists(file, ec)) return true;
+  if (!fs::exists(file, ec)) return {};
   std::ifstream in(file, std::ios::binary);
   std::string text;
   if (in) text.assign(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
-  if (!in.is_open() || in.bad()) {
-    error = FormatString("%s : lecture impossible.", file.c_str());
-    return false;
-  }
-  return velParseRegistry(text, file, keys, error);
+  if (!in.is_open() || in.bad())
+    return VelReadResult::Failed(in.is_open() ? VelReadStatus::kCannotRead : VelReadStatus::kCannotOpen, file, 0,
+                                 FormatString("%s : lecture impossible.", file.c_str()));
+  return velParseRegistry(text, file, keys);
 }
 
 // ROOT\a\b with the root spelt as the table has it and no empty level; "" when invalid.
@@ -108,43 +107,37 @@ Key* FindKey(std::vector<Key>& keys, const std::string& path) {
 
 }  // namespace
 
-bool velParseRegistry(const std::string& text, const std::string& file, std::vector<VelRegistryKey>& keys,
-                      std::string& error) {
+VelReadResult velParseRegistry(const std::string& text, const std::string& file,
+                               std::vector<VelRegistryKey>& keys) {
   std::istringstream in(text);
   std::string line;
   int number = 0;
+  // What was expected, as the registry's messages word it: "F, ligne N : <expected>."
+  auto refuse = [&](const char* expected) {
+    return VelReadResult::Malformed(file, number, expected,
+                                    FormatString("%s, ligne %d : %s.", file.c_str(), number, expected));
+  };
   while (std::getline(in, line)) {
     ++number;
     if (!line.empty() && line.back() == '\r') line.pop_back();
     if (line.empty() || line.front() == ';') continue;
     if (line.front() == '[') {
-      if (line.back() != ']' || line.size() < 3) {
-        error = FormatString("%s, ligne %d : \"]\" attendu à la fin de la clé.", file.c_str(), number);
-        return false;
-      }
+      if (line.back() != ']' || line.size() < 3) return refuse("\"]\" attendu à la fin de la clé");
       keys.push_back({line.substr(1, line.size() - 2), {}});
       continue;
     }
-    if (keys.empty()) {
-      error = FormatString("%s, ligne %d : une clé \"[...]\" est attendue avant la première valeur.",
-                           file.c_str(), number);
-      return false;
-    }
+    if (keys.empty()) return refuse("une clé \"[...]\" est attendue avant la première valeur");
     std::string name, value;
     std::size_t pos = 0;
     if (line.front() == '@')
       pos = 1;
-    else if (!ReadQuoted(line, pos, name)) {
-      error = FormatString("%s, ligne %d : nom de valeur entre guillemets attendu.", file.c_str(), number);
-      return false;
-    }
-    if (pos >= line.size() || line[pos] != '=' || !ReadQuoted(line, ++pos, value) || pos != line.size()) {
-      error = FormatString("%s, ligne %d : =\"texte\" attendu après le nom de valeur.", file.c_str(), number);
-      return false;
-    }
+    else if (!ReadQuoted(line, pos, name))
+      return refuse("nom de valeur entre guillemets attendu");
+    if (pos >= line.size() || line[pos] != '=' || !ReadQuoted(line, ++pos, value) || pos != line.size())
+      return refuse("=\"texte\" attendu après le nom de valeur");
     keys.back().values.emplace_back(name, value);
   }
-  return true;
+  return {};
 }
 
 std::string velSerializeRegistry(const std::vector<VelRegistryKey>& keys) {
@@ -166,17 +159,16 @@ bool velIsRegistryRoot(std::string_view name) {
 
 std::string velRegistryFile() { return (fs::path(velHostSettings().profileDir) / "registre.reg").string(); }
 
-bool velCheckRegistry(std::string& error) {
+VelReadResult velCheckRegistry() {
   std::vector<Key> keys;
-  return Load(keys, error);
+  return Load(keys);
 }
 
 bool velRegQueryValue(std::string_view root, std::string_view keyPath, std::string_view valueName,
                       std::string& out, std::size_t maxBytes) {
   const std::string path = FullPath(root, keyPath);
   std::vector<Key> keys;
-  std::string error;
-  if (path.empty() || !Load(keys, error)) return false;
+  if (path.empty() || !Load(keys)) return false;
   Key* key = FindKey(keys, path);
   if (key == nullptr) return false;
   for (const auto& [name, value] : key->values) {
@@ -197,8 +189,7 @@ bool velRegSetValue(std::string_view root, std::string_view keyPath, std::string
   // Read, changed and written under the lock: two hosts of one profile keep both values.
   const VelFileLock lock(velRegistryFile());
   std::vector<Key> keys;
-  std::string error;
-  if (!lock.locked() || !Load(keys, error)) return false;
+  if (!lock.locked() || !Load(keys)) return false;
   Key* key = FindKey(keys, path);
   if (key == nullptr) {
     keys.push_back({path, {}});

@@ -4,10 +4,12 @@
 #include <filesystem>
 #include <functional>
 #include <map>
+#include <type_traits>
 
 #include "text/text.hpp"
 #include "velhost/documents.h"
 #include "velhost/editor.h"
+#include "velhost/header_vars.h"
 #include "velhost/profile.h"
 
 namespace {
@@ -50,23 +52,70 @@ SysVar ReadOnlyText(std::function<std::string()> text) {
   return v;
 }
 
-// A header setting of the current drawing kept as a 16-bit value.
-SysVar DbShort(int min, int max, std::function<int(AcDbDatabase&)> get,
-               std::function<Acad::ErrorStatus(AcDbDatabase&, int)> set) {
-  SysVar v{Kind::Short, min, max, false, {}, {}};
-  v.get = [get](Value& out) {
+// A header setting of the current drawing, read and set through the table's walk: a
+// number for a number, a layer name for the current layer, a colour for the colour.
+SysVar DbVar(const VelHeaderVar& var, Kind kind) {
+  const std::string name(var.name);
+  SysVar v{kind, var.min, var.max, false, {}, {}};
+  v.get = [name](Value& out) {
     if (Db() == nullptr) return false;
-    out.integer = get(*Db());
+    const VelHeaderSettings& settings = Db()->headerSettings();
+    velWalkHeaderVars(
+        [&](const VelHeaderVar& row, const auto& field) {
+          using Field = std::remove_cvref_t<decltype(field)>;
+          if (name != row.name) return;
+          if constexpr (std::is_same_v<Field, std::string>)
+            out.text = Db()->layerName(Db()->clayer());
+          else if constexpr (std::is_same_v<Field, double>)
+            out.real = field;
+          else if (row.code == 62) {
+            const AcCmColor c = Db()->cecolor();
+            out.text = c.isByLayer() ? "DUCALQUE" : c.isByBlock() ? "DUBLOC" : FormatInt(c.colorIndex());
+          } else
+            out.integer = static_cast<int>(field);
+        },
+        settings);
     return true;
   };
-  v.set = [set](const Value& in, std::string& error) {
+  v.set = [name, code = var.code](const Value& in, std::string& error) {
     if (Db() == nullptr) {
       error = "Aucun dessin ouvert.";
       return false;
     }
-    const Acad::ErrorStatus status = set(*Db(), in.integer);
-    if (status != Acad::eOk) error = FormatString("Valeur refusée par le dessin (%s).", acadErrorStatusText(status));
-    return status == Acad::eOk;
+    VelHeaderSettings settings = Db()->headerSettings();
+    bool understood = true;
+    velWalkHeaderVars(
+        [&](const VelHeaderVar& row, auto& field) {
+          using Field = std::remove_cvref_t<decltype(field)>;
+          if (name != row.name) return;
+          if constexpr (std::is_same_v<Field, std::string>) {
+            field = in.text;
+          } else if constexpr (std::is_same_v<Field, double>) {
+            field = in.real;
+          } else if (row.code == 62) {
+            const std::optional<long long> index = ParseInt(in.text);
+            if (EqualsNoCase(in.text, "DUCALQUE") || EqualsNoCase(in.text, "BYLAYER"))
+              field = AcCmColor::kByLayer;
+            else if (EqualsNoCase(in.text, "DUBLOC") || EqualsNoCase(in.text, "BYBLOCK"))
+              field = AcCmColor::kByBlock;
+            else if (index && *index >= 1 && *index <= 255)
+              field = static_cast<Field>(*index);
+            else
+              understood = false;
+          } else {
+            field = static_cast<Field>(in.integer);
+          }
+        },
+        settings);
+    const Acad::ErrorStatus status = understood ? Db()->setHeaderSettings(settings) : Acad::eInvalidInput;
+    if (status == Acad::eOk) return true;
+    if (code == 8)
+      error = FormatString("Le calque \"%s\" n'existe pas.", in.text.c_str());
+    else if (code == 62)
+      error = "Couleur attendue : 1 à 255, DUCALQUE ou DUBLOC.";
+    else
+      error = FormatString("Valeur refusée par le dessin (%s).", acadErrorStatusText(status));
+    return false;
   };
   return v;
 }
@@ -87,73 +136,16 @@ std::map<std::string, SysVar>& Table() {
       if (doc == nullptr || doc->fileName().empty()) return std::filesystem::current_path().string() + "/";
       return std::filesystem::path(doc->fileName()).parent_path().string() + "/";
     });
-    (*t)["AUNITS"] = DbShort(0, 4, [](AcDbDatabase& d) { return int(d.aunits()); },
-                            [](AcDbDatabase& d, int v) { return d.setAunits(short(v)); });
-    (*t)["ANGDIR"] = DbShort(0, 1, [](AcDbDatabase& d) { return int(d.angdir()); },
-                            [](AcDbDatabase& d, int v) { return d.setAngdir(v != 0); });
-    (*t)["OSMODE"] = DbShort(0, 32767, [](AcDbDatabase& d) { return d.osmode(); },
-                            [](AcDbDatabase& d, int v) { return d.setOsmode(v); });
-    (*t)["ATTDIA"] = DbShort(0, 1, [](AcDbDatabase& d) { return int(d.attdia()); },
-                            [](AcDbDatabase& d, int v) { return d.setAttdia(v != 0); });
-    (*t)["ATTREQ"] = DbShort(0, 1, [](AcDbDatabase& d) { return int(d.attreq()); },
-                            [](AcDbDatabase& d, int v) { return d.setAttreq(v != 0); });
-    (*t)["LIMCHECK"] = DbShort(0, 1, [](AcDbDatabase& d) { return int(d.limcheck()); },
-                              [](AcDbDatabase& d, int v) { return d.setLimcheck(v != 0); });
-    (*t)["ORTHOMODE"] = DbShort(0, 1, [](AcDbDatabase& d) { return int(d.orthomode()); },
-                               [](AcDbDatabase& d, int v) { return d.setOrthomode(v != 0); });
-    SysVar angbase{Kind::Real, 0, 0, false, {}, {}};
-    angbase.get = [](Value& out) {
-      if (Db() == nullptr) return false;
-      out.real = Db()->angbase();
-      return true;
-    };
-    angbase.set = [](const Value& in, std::string& error) {
-      if (Db() == nullptr) {
-        error = "Aucun dessin ouvert.";
-        return false;
-      }
-      return Db()->setAngbase(in.real) == Acad::eOk;
-    };
-    (*t)["ANGBASE"] = angbase;
-    SysVar clayer{Kind::String, 0, 0, false, {}, {}};
-    clayer.get = [](Value& out) {
-      if (Db() == nullptr) return false;
-      out.text = Db()->layerName(Db()->clayer());
-      return true;
-    };
-    clayer.set = [](const Value& in, std::string& error) {
-      AcDbObjectId id;
-      if (Db() == nullptr || Db()->getLayerId(in.text, id) != Acad::eOk) {
-        error = FormatString("Le calque \"%s\" n'existe pas.", in.text.c_str());
-        return false;
-      }
-      return Db()->setClayer(id) == Acad::eOk;
-    };
-    (*t)["CLAYER"] = clayer;
-    SysVar cecolor{Kind::String, 0, 0, false, {}, {}};
-    cecolor.get = [](Value& out) {
-      if (Db() == nullptr) return false;
-      const AcCmColor c = Db()->cecolor();
-      out.text = c.isByLayer() ? "DUCALQUE" : c.isByBlock() ? "DUBLOC" : FormatInt(c.colorIndex());
-      return true;
-    };
-    cecolor.set = [](const Value& in, std::string& error) {
-      AcCmColor c;
-      std::optional<long long> index = ParseInt(in.text);
-      Acad::ErrorStatus status = Acad::eInvalidInput;
-      if (EqualsNoCase(in.text, "DUCALQUE") || EqualsNoCase(in.text, "BYLAYER"))
-        status = c.setColorIndex(AcCmColor::kByLayer);
-      else if (EqualsNoCase(in.text, "DUBLOC") || EqualsNoCase(in.text, "BYBLOCK"))
-        status = c.setColorIndex(AcCmColor::kByBlock);
-      else if (index && *index >= 1 && *index <= 255)
-        status = c.setColorIndex(static_cast<short>(*index));
-      if (status != Acad::eOk || Db() == nullptr || Db()->setCecolor(c) != Acad::eOk) {
-        error = "Couleur attendue : 1 à 255, DUCALQUE ou DUBLOC.";
-        return false;
-      }
-      return true;
-    };
-    (*t)["CECOLOR"] = cecolor;
+    const VelHeaderSettings defaults;
+    velWalkHeaderVars(
+        [t](const VelHeaderVar& var, const auto& field) {
+          using Field = std::remove_cvref_t<decltype(field)>;
+          const Kind kind = std::is_same_v<Field, double> ? Kind::Real
+                            : std::is_same_v<Field, std::string> || var.code == 62 ? Kind::String
+                                                                                    : Kind::Short;
+          (*t)[std::string(var.sysvar())] = DbVar(var, kind);
+        },
+        defaults);
     return t;
   }();
   return *table;

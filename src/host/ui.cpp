@@ -436,6 +436,10 @@ std::optional<VelInputLine> VelScriptedUI::readRawLine(const std::string& prompt
     if (*text == "^C") return std::nullopt;
     return VelInputLine{*text, line_};
   }
+  if (script_.bad()) {
+    read_ = VelReadResult::Failed(VelReadStatus::kCannotRead, name_, errno != 0 ? errno : EIO);
+    read_.line = line_ + 1;
+  }
   ended_ = true;
   return std::nullopt;
 }

@@ -3,6 +3,8 @@
 
 #include <gtest/gtest.h>
 
+#include <sstream>
+
 #include "support/session.hpp"
 #include "support/temp_dir.hpp"
 #include "velhost/documents.h"
@@ -33,6 +35,31 @@ protected:
     VelShell shell;
     std::string error;
 };
+
+TEST_F(Shell, AScriptCutShortByAnInputErrorFails)
+{
+    // A script whose reading fails after its first line, as a disk or a pipe can fail.
+    struct FailingBuffer : std::streambuf {
+        std::string first = "NEW\n";
+        bool given = false;
+        int_type underflow() override
+        {
+            if (given)
+                throw std::ios_base::failure("lecture");
+            given = true;
+            setg(first.data(), first.data(), first.data() + first.size());
+            return traits_type::to_int_type(first[0]);
+        }
+    } buffer;
+    std::istream in(&buffer);
+    std::ostringstream out;
+    VelScriptedUI ui(in, out, "s.scr");
+    VelUserInterface* before = velSetUI(&ui);
+    EXPECT_EQ(shell.run(), 1);
+    velSetUI(before);
+    EXPECT_EQ(ui.readResult().status, VelReadStatus::kCannotRead);
+    EXPECT_EQ(ui.readResult().line, 2);
+}
 
 TEST_F(Shell, BuiltInFailuresSayWhy)
 {

@@ -34,8 +34,7 @@ const std::string kDrawing =
 TEST(VelReadEntities, WalksEntitiesInFileOrder)
 {
     std::unique_ptr<AcDbDatabase> database;
-    std::string error;
-    ASSERT_TRUE(velReadDrawing(kDrawing, "entites.dxf", database, error)) << error;
+    ASSERT_EQ(velReadDrawing(kDrawing, "entites.dxf", database).description(), "");
     std::size_t skipped = 99;
     const std::vector<VelEntity> entities = velReadEntities(*database, &skipped);
     EXPECT_EQ(skipped, 0u);

@@ -11,8 +11,7 @@ namespace {
 std::unique_ptr<AcDbDatabase> OpenFixture(const char* name)
 {
     std::unique_ptr<AcDbDatabase> db;
-    std::string error;
-    EXPECT_TRUE(velOpenDrawing(std::string(VEL_TEST_DATA) + "/dxf/" + name, db, error)) << error;
+    EXPECT_EQ(velOpenDrawing(std::string(VEL_TEST_DATA) + "/dxf/" + name, db).description(), "");
     return db;
 }
 
@@ -22,7 +21,7 @@ TEST(AcDbDatabase, NewDrawingHasDefaultsAndLayerZero)
     EXPECT_EQ(db.dxfVersion(), "AC1032");
     EXPECT_EQ(db.fileName(), "");
     EXPECT_EQ(db.aunits(), 0);
-    EXPECT_EQ(db.osmode(), kVelDefaultOsmode);
+    EXPECT_EQ(db.osmode(), VelHeaderSettings{}.osmode);
     EXPECT_TRUE(db.cecolor().isByLayer());
     EXPECT_TRUE(db.attreq());
     EXPECT_EQ(db.layerName(db.clayer()), "0");
@@ -31,11 +30,36 @@ TEST(AcDbDatabase, NewDrawingHasDefaultsAndLayerZero)
     EXPECT_FALSE(db.isModified());
 }
 
+TEST(AcDbDatabase, NewDrawingsShareNothing)
+{
+    std::string blank, error;
+    {
+        AcDbDatabase first;
+        ASSERT_TRUE(velWriteDrawing(first, blank, error)) << error;
+        AcDbObjectId layer;
+        ASSERT_EQ(first.addLayer("PREMIER", layer), Acad::eOk);
+        ASSERT_EQ(first.setOsmode(33), Acad::eOk);
+        AcDbDictionary* nod = nullptr;
+        ASSERT_EQ(first.getNamedObjectsDictionary(nod, AcDb::kForWrite), Acad::eOk);
+        auto* record = new AcDbXrecord;
+        AcDbObjectId id;
+        ASSERT_EQ(nod->setAt("PREMIER", record, id), Acad::eOk);
+        record->close();
+        nod->close();
+    }
+    AcDbDatabase second;
+    EXPECT_EQ(second.layerNames(), std::vector<std::string>{"0"});
+    std::string text;
+    ASSERT_TRUE(velWriteDrawing(second, text, error)) << error;
+    EXPECT_EQ(text, blank);
+}
+
 TEST(AcDbDatabase, SettersCheckTheirValues)
 {
     AcDbDatabase db;
     EXPECT_EQ(db.setAunits(5), Acad::eInvalidInput);
     EXPECT_EQ(db.setOsmode(-1), Acad::eInvalidInput);
+    EXPECT_EQ(db.setOsmode(32768), Acad::eInvalidInput);
     AcCmColor color;
     EXPECT_EQ(color.setColorIndex(300), Acad::eInvalidInput);
     EXPECT_EQ(color.setColorIndex(1), Acad::eOk);
@@ -241,7 +265,7 @@ TEST(AcDbXrecord, DataRoundTripsThroughTheDrawing)
     std::string error;
     ASSERT_TRUE(velWriteDrawing(db, text, error)) << error;
     std::unique_ptr<AcDbDatabase> back;
-    ASSERT_TRUE(velReadDrawing(text, "neuf.dxf", back, error)) << error;
+    ASSERT_EQ(velReadDrawing(text, "neuf.dxf", back).description(), "");
     AcDbXrecord* again = nullptr;
     ASSERT_EQ(acdbOpenObject(again, back->idFromHandle(id.handle()), AcDb::kForRead), Acad::eOk);
     resbuf* chain = nullptr;

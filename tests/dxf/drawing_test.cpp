@@ -6,6 +6,8 @@
 
 #include <unistd.h>
 
+#include <cerrno>
+#include <cstring>
 #include <filesystem>
 #include <fstream>
 #include <sstream>
@@ -34,8 +36,7 @@ std::string Fixture(const char* name)
 std::unique_ptr<AcDbDatabase> Open(const std::string& path)
 {
     std::unique_ptr<AcDbDatabase> db;
-    std::string error;
-    EXPECT_TRUE(velOpenDrawing(path, db, error)) << error;
+    EXPECT_EQ(velOpenDrawing(path, db).description(), "");
     return db;
 }
 
@@ -90,9 +91,9 @@ TEST(Drawing, HeaderSettingsOfAnOlderFile)
 TEST(Drawing, OmittedHeaderVariablesTakeDefaultsAndAreAddedOnceSet)
 {
     auto db = Open(Fixture("r2018.dxf"));
-    EXPECT_EQ(db->osmode(), kVelDefaultOsmode);
-    EXPECT_EQ(db->attdia(), kVelDefaultAttdia);
-    EXPECT_EQ(db->attreq(), kVelDefaultAttreq);
+    EXPECT_EQ(db->osmode(), VelHeaderSettings{}.osmode);
+    EXPECT_EQ(db->attdia(), VelHeaderSettings{}.attdia);
+    EXPECT_EQ(db->attreq(), VelHeaderSettings{}.attreq);
     EXPECT_TRUE(db->limcheck());
     EXPECT_TRUE(db->orthomode());
     ASSERT_EQ(db->setOsmode(512), Acad::eOk);
@@ -100,7 +101,7 @@ TEST(Drawing, OmittedHeaderVariablesTakeDefaultsAndAreAddedOnceSet)
     EXPECT_TRUE(db->isModified());
     std::unique_ptr<AcDbDatabase> back;
     std::string error;
-    ASSERT_TRUE(velReadDrawing(Written(*db), "copie.dxf", back, error)) << error;
+    ASSERT_EQ(velReadDrawing(Written(*db), "copie.dxf", back).description(), "");
     EXPECT_EQ(back->osmode(), 512);
     EXPECT_FALSE(back->limcheck());
     EXPECT_TRUE(back->orthomode());
@@ -129,13 +130,18 @@ TEST(Drawing, NewObjectsGetHandlesBelowTheSeedAndTheirApplicationIsRegistered)
         }
         std::unique_ptr<AcDbDatabase> back;
         std::string error;
-        ASSERT_TRUE(velReadDrawing(text, file, back, error)) << error;
+        ASSERT_EQ(velReadDrawing(text, file, back).description(), "");
         EXPECT_TRUE(back->isRegApp("NOUVELLE_APP"));
-        const auto& f = back->file();
+        const vel::dxf::Sections& records = back->file().records();
         std::uint64_t highest = 0;
-        for (const auto& r : f.records)
-            highest = std::max(highest, r.handle);
-        EXPECT_GT(f.handseed, highest);
+        for (std::size_t i = 0; i < records.size(); ++i)
+            highest = std::max(highest, records[i].handle);
+        const auto seed = text.find("$HANDSEED");
+        ASSERT_NE(seed, std::string::npos);
+        std::istringstream header(text.substr(seed + 9));
+        std::string code, value;
+        header >> code >> value;
+        EXPECT_GT(std::stoull(value, nullptr, 16), highest);
         AcDbDictionary* nod2 = nullptr;
         ASSERT_EQ(back->getNamedObjectsDictionary(nod2, AcDb::kForRead), Acad::eOk);
         AcDbObject* again = nullptr;
@@ -160,7 +166,7 @@ TEST(Drawing, TextOfOlderFilesIsWrittenInTheirCodePage)
     EXPECT_NE(text.find("\n  8\nCalque \\U+03A9 \xE9\n"), std::string::npos);
     std::unique_ptr<AcDbDatabase> back;
     std::string error;
-    ASSERT_TRUE(velReadDrawing(text, "copie.dxf", back, error)) << error;
+    ASSERT_EQ(velReadDrawing(text, "copie.dxf", back).description(), "");
     EXPECT_EQ(back->layerName(back->clayer()), "Calque Ω é");
 }
 
@@ -174,7 +180,7 @@ TEST(Drawing, R12DrawingsHoldNoDictionaries)
     ASSERT_EQ(db->addRegApp("APP_R12"), Acad::eOk);
     std::unique_ptr<AcDbDatabase> back;
     std::string error;
-    ASSERT_TRUE(velReadDrawing(Written(*db), "r12.dxf", back, error)) << error;
+    ASSERT_EQ(velReadDrawing(Written(*db), "r12.dxf", back).description(), "");
     EXPECT_EQ(back->getLayerId("nouveau", layer), Acad::eOk);
     EXPECT_TRUE(back->isRegApp("APP_R12"));
 }
@@ -215,8 +221,7 @@ TEST(Drawing, MalformedFilesAreRefusedWithFileLineAndExpectation)
     const std::string sound = Sound();
     {
         std::unique_ptr<AcDbDatabase> db;
-        std::string error;
-        ASSERT_TRUE(velReadDrawing(sound, "bon.dxf", db, error)) << error;
+        ASSERT_EQ(velReadDrawing(sound, "bon.dxf", db).description(), "");
     }
     struct Case {
         const char* name;
@@ -261,15 +266,18 @@ TEST(Drawing, MalformedFilesAreRefusedWithFileLineAndExpectation)
     for (const auto& c : cases) {
         SCOPED_TRACE(c.name);
         std::unique_ptr<AcDbDatabase> db;
-        std::string error;
-        EXPECT_FALSE(velReadDrawing(c.text, "plan.dxf", db, error));
+        const VelReadResult read = velReadDrawing(c.text, "plan.dxf", db);
+        EXPECT_EQ(read.status, VelReadStatus::kMalformed);
         EXPECT_FALSE(db);
         std::uint32_t line = c.marker.empty() ? 0 : LineOf(c.text, c.marker);
         if (c.marker.empty())
             line = static_cast<std::uint32_t>(std::count(c.text.begin(), c.text.end(), '\n')) + 1;
         if (std::string(c.name) == "cut binary signature")
             line = 1;
-        EXPECT_EQ(error, "« plan.dxf », ligne " + std::to_string(line + c.lineShift) + " : il fallait " + c.expected);
+        EXPECT_EQ(read.line, static_cast<std::int64_t>(line) + c.lineShift);
+        EXPECT_EQ(read.expected, c.expected);
+        EXPECT_EQ(read.description(),
+                  "« plan.dxf », ligne " + std::to_string(line + c.lineShift) + " : il fallait " + c.expected);
     }
 }
 
@@ -278,7 +286,7 @@ TEST(Drawing, ASeedLeftTooLowIsRaisedOnlyWhenSomethingIsWritten)
     const std::string text = Replace(Sound(), "$HANDSEED\n  5\nFF", "$HANDSEED\n  5\n2");
     std::unique_ptr<AcDbDatabase> db;
     std::string error;
-    ASSERT_TRUE(velReadDrawing(text, "graine.dxf", db, error)) << error;
+    ASSERT_EQ(velReadDrawing(text, "graine.dxf", db).description(), "");
     EXPECT_EQ(Written(*db), text);
     AcDbDictionary* nod = nullptr;
     ASSERT_EQ(db->getNamedObjectsDictionary(nod, AcDb::kForWrite), Acad::eOk);
@@ -299,10 +307,10 @@ TEST(Drawing, DictionaryEntriesMayNameDictionariesOfAnySection)
                                      "  0\nDICTIONARY\n  5\n20\n  3\nY\n350\nC\n");
     const std::string looped = Replace(text, "  3\nA\n350\nD\n", "  3\nA\n350\nD\n  3\nZ\n350\n20\n");
     std::unique_ptr<AcDbDatabase> db;
-    std::string error;
-    EXPECT_FALSE(velReadDrawing(looped, "boucle.dxf", db, error));
-    EXPECT_EQ(error, "« boucle.dxf », ligne 75 : il fallait une entrée qui ne remonte pas à un dictionnaire parent "
-                     "(« Z » ramène au dictionnaire de la ligne 47)");
+    const VelReadResult read = velReadDrawing(looped, "boucle.dxf", db);
+    EXPECT_EQ(read.line, 75);
+    EXPECT_EQ(read.expected, "une entrée qui ne remonte pas à un dictionnaire parent "
+                             "(« Z » ramène au dictionnaire de la ligne 47)");
 }
 
 TEST(Drawing, DuplicateHandlesFoundHoweverShuffled)
@@ -316,12 +324,13 @@ TEST(Drawing, DuplicateHandlesFoundHoweverShuffled)
                                           "  0\nENDSEC\n  0\nSECTION\n  2\nOBJECTS");
         std::unique_ptr<AcDbDatabase> db;
         std::string error;
-        ASSERT_TRUE(velReadDrawing(sound, "lignes.dxf", db, error)) << error;
+        ASSERT_EQ(velReadDrawing(sound, "lignes.dxf", db).description(), "");
         EXPECT_FALSE(db->idFromHandle(0x101).isNull());
         const std::string twice = Replace(sound, "  5\n102\n", "  5\n" + FormatHandle(0x100 + count) + "\n");
-        EXPECT_FALSE(velReadDrawing(twice, "lignes.dxf", db, error));
-        EXPECT_NE(error.find("il fallait un identifiant unique (" + FormatHandle(0x100 + count)), std::string::npos)
-            << error;
+        const VelReadResult read = velReadDrawing(twice, "lignes.dxf", db);
+        EXPECT_EQ(read.status, VelReadStatus::kMalformed);
+        EXPECT_EQ(read.expected.rfind("un identifiant unique (" + FormatHandle(0x100 + count) + " ", 0), 0u)
+            << read.description();
     }
 }
 
@@ -330,7 +339,7 @@ TEST(Drawing, HandlesUseAll64Bits)
     const std::string text = Replace(Sound(), "  0\nLINE\n  5\n20\n", "  0\nLINE\n  5\nfffffffffffffffe\n");
     std::unique_ptr<AcDbDatabase> db;
     std::string error;
-    ASSERT_TRUE(velReadDrawing(text, "grand.dxf", db, error)) << error;
+    ASSERT_EQ(velReadDrawing(text, "grand.dxf", db).description(), "");
     AcDbObject* line = nullptr;
     ASSERT_EQ(db->openObject(line, db->idFromHandle(0xFFFFFFFFFFFFFFFEULL), AcDb::kForRead), Acad::eOk);
     EXPECT_EQ(line->dxfName(), "LINE");
@@ -360,7 +369,7 @@ TEST(Drawing, BinaryDrawingsAreWrittenBackInBinary)
         EXPECT_EQ(bytes.substr(0, 22), std::string_view("AutoCAD Binary DXF\r\n\x1a\0", 22));
         std::unique_ptr<AcDbDatabase> back;
         std::string error;
-        ASSERT_TRUE(velReadDrawing(bytes, file, back, error)) << error;
+        ASSERT_EQ(velReadDrawing(bytes, file, back).description(), "");
         EXPECT_EQ(back->layerName(back->clayer()), "BINAIRE");
         EXPECT_EQ(back->dxfVersion(), db->dxfVersion());
     }
@@ -369,30 +378,43 @@ TEST(Drawing, BinaryDrawingsAreWrittenBackInBinary)
 TEST(Drawing, MalformedBinaryDrawingsNameTheGroup)
 {
     const std::string good = Slurp(Fixture("r2018_bin.dxf"));
-    std::unique_ptr<AcDbDatabase> db;
-    std::string error;
-    EXPECT_FALSE(velReadDrawing(good.substr(0, 40), "b.dxf", db, error));
-    EXPECT_EQ(error, "« b.dxf » (DXF binaire), groupe 2 : il fallait un texte terminé par un octet nul (fichier tronqué)");
     std::string spoiled = good;
     spoiled.replace(24, 7, "SECTIOX");
-    EXPECT_FALSE(velReadDrawing(spoiled, "b.dxf", db, error));
-    EXPECT_EQ(error, "« b.dxf » (DXF binaire), groupe 1 : il fallait 0 SECTION");
     // Values the text form could not give back bit for bit are refused.
     std::string nan("AutoCAD Binary DXF\r\n\x1a\0\0\0SECTION\0\x02\0HEADER\0\x09\0$ANGBASE\0\x32\0", 54);
     nan.append("\0\0\0\0\0\0\xF8\x7F", 8);
-    EXPECT_FALSE(velReadDrawing(nan, "b.dxf", db, error));
-    EXPECT_EQ(error, "« b.dxf » (DXF binaire), groupe 4 : il fallait un nombre réel fini");
     const std::string negative("AutoCAD Binary DXF\r\n\x1a\0\0\0SECTION\0\xFE\xFFx\0", 36);
-    EXPECT_FALSE(velReadDrawing(negative, "b.dxf", db, error));
-    EXPECT_EQ(error, "« b.dxf » (DXF binaire), groupe 2 : il fallait un code de groupe de 0 à 32767");
+    struct Case {
+        std::string bytes;
+        int group;
+        const char* expected;
+    };
+    const Case cases[] = {
+        {good.substr(0, 40), 2, "un texte terminé par un octet nul (fichier tronqué)"},
+        {spoiled, 1, "0 SECTION"},
+        {nan, 4, "un nombre réel fini"},
+        {negative, 2, "un code de groupe de 0 à 32767"},
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.expected);
+        std::unique_ptr<AcDbDatabase> db;
+        const VelReadResult read = velReadDrawing(c.bytes, "b.dxf", db);
+        EXPECT_EQ(read.status, VelReadStatus::kMalformed);
+        EXPECT_EQ(read.line, c.group);
+        EXPECT_EQ(read.description(),
+                  "« b.dxf » (DXF binaire), groupe " + std::to_string(c.group) + " : il fallait " + c.expected);
+    }
 }
 
 TEST(Drawing, OpenAndSaveReportFileErrors)
 {
     std::unique_ptr<AcDbDatabase> db;
+    const VelReadResult missing = velOpenDrawing("/nonexistent/plan.dxf", db);
+    EXPECT_EQ(missing.status, VelReadStatus::kNotFound);
+    EXPECT_EQ(missing.description(), "« /nonexistent/plan.dxf » : impossible d'ouvrir le fichier (" +
+                                         std::string(std::strerror(ENOENT)) + ")");
+    EXPECT_EQ(velOpenDrawing("/tmp", db).status, VelReadStatus::kNotAFile);
     std::string error;
-    EXPECT_FALSE(velOpenDrawing("/nonexistent/plan.dxf", db, error));
-    EXPECT_EQ(error.rfind("« /nonexistent/plan.dxf » : impossible d'ouvrir le fichier", 0), 0u) << error;
     AcDbDatabase fresh;
     EXPECT_FALSE(velSaveDrawing(fresh, "/nonexistent/plan.dxf", error));
     EXPECT_EQ(error.rfind("Fichier « /nonexistent/plan.dxf » non enregistré : dossier introuvable", 0), 0u) << error;

@@ -44,20 +44,23 @@ TEST_F(Registry, MalformedFileIsNamedAndLeftAlone)
 {
     struct Case {
         const char* content;
-        const char* message;
+        int line;
+        const char* expected;
     };
     const Case cases[] = {
-        {"[HKEY_USERS\\a]\n\"x\"=\"1\"\n\"y\"=2\n", "ligne 3 : =\"texte\" attendu après le nom de valeur."},
-        {"\"x\"=\"1\"\n", "ligne 1 : une clé \"[...]\" est attendue avant la première valeur."},
-        {"[HKEY_USERS\\a\n", "ligne 1 : \"]\" attendu à la fin de la clé."},
-        {"[HKEY_USERS\\a]\nx=\"1\"\n", "ligne 2 : nom de valeur entre guillemets attendu."},
+        {"[HKEY_USERS\\a]\n\"x\"=\"1\"\n\"y\"=2\n", 3, "=\"texte\" attendu après le nom de valeur"},
+        {"\"x\"=\"1\"\n", 1, "une clé \"[...]\" est attendue avant la première valeur"},
+        {"[HKEY_USERS\\a\n", 1, "\"]\" attendu à la fin de la clé"},
+        {"[HKEY_USERS\\a]\nx=\"1\"\n", 2, "nom de valeur entre guillemets attendu"},
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.content);
         dir.Write("profil/registre.reg", c.content);
-        std::string error;
-        EXPECT_FALSE(velCheckRegistry(error));
-        EXPECT_EQ(error, velRegistryFile() + ", " + c.message);
+        const VelReadResult read = velCheckRegistry();
+        EXPECT_EQ(read.status, VelReadStatus::kMalformed);
+        EXPECT_EQ(read.line, c.line);
+        EXPECT_EQ(read.description(),
+                  velRegistryFile() + ", ligne " + std::to_string(c.line) + " : " + c.expected + ".");
         EXPECT_FALSE(velRegSetValue("HKEY_USERS", "a", "z", "3"));
         EXPECT_EQ(dir.Read("profil/registre.reg"), c.content);
     }

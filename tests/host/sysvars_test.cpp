@@ -1,9 +1,13 @@
 // System variables kept by the host and those of the current drawing's header.
 #include <gtest/gtest.h>
 
+#include <type_traits>
+
 #include "host_fixture.hpp"
+#include "velhost/dbase.h"
 #include "velhost/documents.h"
 #include "velhost/editor.h"
+#include "velhost/header_vars.h"
 
 namespace {
 
@@ -13,6 +17,12 @@ int GetShort(const char* name)
     EXPECT_EQ(acedGetVar(name, &rb), RTNORM);
     EXPECT_EQ(rb.restype, RTSHORT);
     return rb.resval.rint;
+}
+
+std::string FormatRange(const std::string& name, const VelHeaderVar& var)
+{
+    return "La variable " + name + " attend une valeur de " + std::to_string(var.min) + " à " +
+           std::to_string(var.max) + ".";
 }
 
 int SetShort(const char* name, int value)
@@ -88,6 +98,54 @@ TEST(SysVars, DrawingVariablesFollowTheCurrentDocument)
     EXPECT_EQ(velSysVarText("CECOLOR"), "DUCALQUE");
     EXPECT_EQ(velSysVarText("CLAYER"), "0");
     EXPECT_EQ(velSysVarText("DWGNAME"), a->docTitle());
+    acDocManagerPtr()->closeAll();
+}
+
+// Each variable of the header table set away from its default through its system
+// variable, then saved and read back: the system variables, the database, the writer
+// and the reader must agree on every row.
+TEST(SysVars, EveryHeaderVariableRoundTripsThroughTheDrawingFile)
+{
+    ScriptedSession session;
+    AcApDocument* doc = acDocManagerPtr()->createDocument(nullptr, "");
+    AcDbObjectId layer;
+    ASSERT_EQ(doc->database()->addLayer("Voirie", layer), Acad::eOk);
+    const VelHeaderSettings defaults;
+    velWalkHeaderVars(
+        [&](const VelHeaderVar& var, const auto& initial) {
+            using Field = std::remove_cvref_t<decltype(initial)>;
+            const std::string name(var.sysvar());
+            SCOPED_TRACE(name);
+            std::string error;
+            std::string value;
+            if constexpr (std::is_same_v<Field, std::string>)
+                value = "voirie";
+            else if constexpr (std::is_same_v<Field, double>)
+                value = "1.5";
+            else if (var.code == 62)
+                value = "5";
+            else
+                value = std::to_string(static_cast<int>(initial) == var.max ? var.min : var.max);
+            EXPECT_EQ(velSetSysVarText(name, value, error), RTNORM) << error;
+            if (std::is_integral_v<Field> && var.code != 62) {
+                EXPECT_EQ(velSetSysVarText(name, std::to_string(var.max + 1), error), RTERROR);
+                EXPECT_EQ(error, FormatRange(name, var));
+            }
+        },
+        defaults);
+    std::string text;
+    std::string error;
+    ASSERT_TRUE(velWriteDrawing(*doc->database(), text, error)) << error;
+    std::unique_ptr<AcDbDatabase> back;
+    ASSERT_EQ(velReadDrawing(text, "retour.dxf", back).description(), "");
+    velWalkHeaderVars(
+        [&](const VelHeaderVar& var, const auto& read, const auto& set, const auto& initial) {
+            SCOPED_TRACE(var.name);
+            EXPECT_EQ(read, set);
+            EXPECT_NE(read, initial);
+        },
+        back->headerSettings(), doc->database()->headerSettings(), defaults);
+    EXPECT_EQ(back->layerName(back->clayer()), "Voirie");
     acDocManagerPtr()->closeAll();
 }
 

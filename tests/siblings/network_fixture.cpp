@@ -100,8 +100,8 @@ std::unique_ptr<AcDbDatabase> DrawingWith(const std::string& entities)
     }
     text.insert(at + marker.size(), entities);
     std::unique_ptr<AcDbDatabase> database;
-    if (!velReadDrawing(text, "reseaux.dxf", database, error)) {
-        ADD_FAILURE() << error;
+    if (const VelReadResult read = velReadDrawing(text, "reseaux.dxf", database); !read) {
+        ADD_FAILURE() << read.description();
         return nullptr;
     }
     return database;

@@ -234,6 +234,11 @@ bool XDataChecker::Finish()
     return true;
 }
 
+bool IsDictionaryType(std::string_view type)
+{
+    return type == "DICTIONARY" || type == "ACDBDICTIONARYWDFLT";
+}
+
 bool ParseObject(std::string_view bytes, std::uint32_t firstLine, const TextEncoding& encoding,
                  ObjectBody& body, ParseError& error)
 {
@@ -253,7 +258,7 @@ bool ParseObject(std::string_view bytes, std::uint32_t firstLine, const TextEnco
     while (reader.next(t)) {
         if (first) {
             body.type = std::string(TrimRight(t.value));
-            body.isDictionary = body.type == "DICTIONARY" || body.type == "ACDBDICTIONARYWDFLT";
+            body.isDictionary = IsDictionaryType(body.type);
             body.tags.push_back(t);
             first = false;
             continue;

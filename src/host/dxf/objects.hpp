@@ -13,9 +13,6 @@
 #include "host/dxf/tags.hpp"
 #include "velhost/resbuf.h"
 
-class AcDbDatabase;
-class AcDbObject;
-
 namespace vel::dxf {
 
 // A dictionary entry: key (UTF-8 and as written in the file), object, and whether the
@@ -34,16 +31,12 @@ struct ParseError {
     std::string expected;
 };
 
-// Everything the database knows of one object.
+// One object as its tags, with the parts the host interprets picked out.
 struct ObjectBody {
     std::string type;
-    AcDbDatabase* database = nullptr;
     std::uint64_t handle = 0;       // 0: the object has none (R12)
     bool handleWritten = false;     // the file holds the handle as a tag
     std::uint64_t owner = 0;
-    std::size_t record = SIZE_MAX;  // index of the object in the drawing's record list
-    int readers = 0;
-    bool writer = false;
     bool dirty = false;             // must be written from the tags, not the file bytes
     bool isDictionary = false;
     bool hardOwner = false;         // dictionary entries written as 360
@@ -62,6 +55,9 @@ struct ObjectBody {
     }
     std::deque<std::string> arena;
 };
+
+// Whether a record of this type is a dictionary.
+bool IsDictionaryType(std::string_view type);
 
 // Reads one object from its bytes (beginning with its 0 tag). False with `error` set
 // when the object is malformed.

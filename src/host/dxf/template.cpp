@@ -2,7 +2,10 @@
 // blocks, layouts and dictionaries every reader expects, layer "0" current.
 #include <string_view>
 
+#include "host/dxf/drawing.hpp"
+
 namespace vel::dxf {
+namespace {
 
 std::string_view NewDrawingDxf()
 {
@@ -844,6 +847,26 @@ ENDSEC
 EOF
 )dxf";
     return kTemplate;
+}
+
+}  // namespace
+
+std::unique_ptr<DrawingFile> DrawingFile::New()
+{
+    static const std::unique_ptr<const DrawingFile> kTemplate = [] {
+        auto source = std::make_unique<Source>();
+        source->Own(std::string(NewDrawingDxf()));
+        std::unique_ptr<DrawingFile> file;
+        if (!Read(std::move(source), "", file)) {
+            // Never for the text above (a test reads it); a drawing with no section
+            // still lets the host run.
+            source = std::make_unique<Source>();
+            source->Own("  0\nEOF\n");
+            Read(std::move(source), "", file);
+        }
+        return file;
+    }();
+    return kTemplate->Copy();
 }
 
 }  // namespace vel::dxf

@@ -1,7 +1,10 @@
 // Saving and restoring the drawing settings of one document around a command.
 #include "module/document_state.hpp"
 
+#include <type_traits>
+
 #include "velhost/editor.h"
+#include "velhost/header_vars.h"
 
 namespace {
 
@@ -53,16 +56,19 @@ bool CArxGlobals::SaveSettings()
     AcDbDatabase* db = WorkingDatabase();
     if (db == nullptr)
         return false;
-    aunits = db->aunits();
-    angbase = db->angbase();
-    angdir = db->angdir();
-    osmode = static_cast<short>(db->osmode());
-    cecolor = db->cecolor();
-    attdia = db->attdia();
-    attreq = db->attreq();
-    limcheck = db->limcheck();
-    orthomode = db->orthomode();
-    clayer = db->clayer();
+    // Each setting into the field of the same name: the record holds a layer by its id and
+    // the colour as a colour.
+    velWalkHeaderVars(
+        [db](const VelHeaderVar&, auto& mine, const auto& drawing) {
+            using Mine = std::remove_cvref_t<decltype(mine)>;
+            if constexpr (std::is_same_v<Mine, AcDbObjectId>)
+                db->getLayerId(drawing, mine);
+            else if constexpr (std::is_same_v<Mine, AcCmColor>)
+                mine = db->cecolor();
+            else
+                mine = static_cast<Mine>(drawing);
+        },
+        *this, db->headerSettings());
     aflags = GetShortVar("AFLAGS");
     ucsfollow = GetShortVar("UCSFOLLOW") == 1;
     restoreLayer = true;
@@ -89,17 +95,24 @@ void CArxGlobals::RestoreSettings(bool restoreLayer_)
         return;
     // Settings saved from another drawing would corrupt this one: they are dropped.
     if (db == source) {
-        db->setAunits(aunits);
-        db->setAngbase(angbase);
-        db->setAngdir(angdir);
-        db->setOsmode(osmode);
-        db->setCecolor(cecolor);
-        db->setAttdia(attdia);
-        db->setAttreq(attreq);
-        db->setLimcheck(limcheck);
-        db->setOrthomode(orthomode);
-        if (restoreLayer_)
-            db->setClayer(clayer);
+        VelHeaderSettings settings = db->headerSettings();
+        velWalkHeaderVars(
+            [&](const VelHeaderVar&, auto& drawing, const auto& mine) {
+                using Mine = std::remove_cvref_t<decltype(mine)>;
+                if constexpr (std::is_same_v<Mine, AcDbObjectId>) {
+                    const std::string layer = db->layerName(mine);
+                    if (restoreLayer_ && !layer.empty())
+                        drawing = layer;
+                } else if constexpr (std::is_same_v<Mine, AcCmColor>) {
+                    // A colour the record cannot hold (by entity) stays when it was not changed.
+                    if (!(db->cecolor() == mine))
+                        drawing = mine.colorIndex();
+                } else {
+                    drawing = mine;
+                }
+            },
+            settings, *this);
+        db->setHeaderSettings(settings);
         SetShortVar("AFLAGS", aflags);
         SetShortVar("UCSFOLLOW", ucsfollow ? 1 : 0);
     }

@@ -79,6 +79,20 @@ struct VelFileIdentity {
 };
 VelFileIdentity velFileIdentity(const std::string& path);
 
+// Where a file is and when it last changed, as the system keeps them, without reading it:
+// two equal stamps mean that nothing wrote, replaced or renamed the file in between (to
+// the precision of the file system's times).
+struct VelFileStamp {
+  bool exists = false;
+  std::uint64_t device = 0;
+  std::uint64_t inode = 0;
+  std::uint64_t size = 0;
+  std::int64_t modified = 0;  // nanoseconds since 1970
+  std::int64_t changed = 0;   // status change (ctime), nanoseconds since 1970
+  bool operator==(const VelFileStamp&) const = default;
+};
+VelFileStamp velFileStamp(const std::string& path);
+
 // A regular file read whole in one go, with the identity of exactly the bytes read: a
 // reader that keeps the identity needs no second reading, and a version written between
 // two readings cannot pass for the one parsed.

@@ -440,6 +440,19 @@ VelFileIdentity velFileIdentity(const std::string& path) {
   return identity;
 }
 
+VelFileStamp velFileStamp(const std::string& path) {
+  VelFileStamp stamp;
+  struct stat st {};
+  if (::stat(path.c_str(), &st) != 0) return stamp;
+  stamp.exists = true;
+  stamp.device = static_cast<std::uint64_t>(st.st_dev);
+  stamp.inode = static_cast<std::uint64_t>(st.st_ino);
+  stamp.size = static_cast<std::uint64_t>(st.st_size);
+  stamp.modified = ModifiedOf(st);
+  stamp.changed = static_cast<std::int64_t>(st.st_ctim.tv_sec) * 1000000000 + st.st_ctim.tv_nsec;
+  return stamp;
+}
+
 VelFileContent velReadFile(const std::string& path) {
   VelFileContent content;
   VelFileIdentity& identity = content.identity;

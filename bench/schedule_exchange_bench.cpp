@@ -17,6 +17,7 @@
 #include <climits>
 #include <filesystem>
 #include <malloc.h>
+#include <unistd.h>
 
 namespace {
 
@@ -36,6 +37,19 @@ fs::path Folder()
 {
     static const fs::path folder = [] {
         fs::path f = fs::temp_directory_path() / "bench_schedule_exchange";
+        fs::create_directories(f);
+        return f;
+    }();
+    return folder;
+}
+
+// What this run writes, apart from the files of other runs on the machine: a file left
+// by another run is one this run never read, which the writer rightly refuses to replace.
+fs::path OutputFolder()
+{
+    static const fs::path folder = [] {
+        fs::path f = Folder() / FormatString("run-%ld", static_cast<long>(getpid()));
+        fs::remove_all(f);
         fs::create_directories(f);
         return f;
     }();
@@ -128,8 +142,14 @@ void BM_Write(benchmark::State& state)
     CZodEVIBdr bdr;
     bdr.path = ScheduleFile(state.range(0));
     Read(bdr);
-    bdr.path = (Folder() / "written.xml").string();
-    Write(bdr);
+    // Created by the first write, then replaced as a user saving again replaces it: each
+    // timed write checks the file against the version written, locks, syncs and keeps a
+    // backup.
+    bdr.path = (OutputFolder() / "written.xml").string();
+    fs::remove(bdr.path);
+    fs::remove(bdr.path + ".bak");
+    if (!Write(bdr))
+        state.SkipWithError("first Write failed");
     for (auto _ : state)
         if (!Write(bdr))
             state.SkipWithError("Write failed");
@@ -141,7 +161,7 @@ void BM_BareSave(benchmark::State& state)
     const std::string path = ScheduleFile(state.range(0));
     pugi::xml_document document;
     document.load_file(path.c_str());
-    const std::string out = (Folder() / "saved.xml").string();
+    const std::string out = (OutputFolder() / "saved.xml").string();
     document.save_file(out.c_str());
     for (auto _ : state)
         if (!document.save_file(out.c_str()))
@@ -173,5 +193,8 @@ int main(int argc, char** argv)
         ratios.push_back({std::string("Write / save, ") + n + " articles", std::string("BM_Write/") + n,
                           std::string("BM_BareSave/") + n});
     }
-    return RunWithRatios(argc, argv, std::move(ratios));
+    const int status = RunWithRatios(argc, argv, std::move(ratios));
+    std::error_code error;
+    fs::remove_all(OutputFolder(), error);
+    return status;
 }

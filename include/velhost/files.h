@@ -4,7 +4,9 @@
 
 #include <sys/types.h>
 
+#include <cstddef>
 #include <cstdint>
+#include <memory>
 #include <string>
 #include <string_view>
 
@@ -76,6 +78,46 @@ struct VelFileIdentity {
   bool sameContent(const VelFileIdentity& other) const;
 };
 VelFileIdentity velFileIdentity(const std::string& path);
+
+// Where a file is and when it last changed, as the system keeps them, without reading it:
+// two equal stamps mean that nothing wrote, replaced or renamed the file in between (to
+// the precision of the file system's times).
+struct VelFileStamp {
+  bool exists = false;
+  std::uint64_t device = 0;
+  std::uint64_t inode = 0;
+  std::uint64_t size = 0;
+  std::int64_t modified = 0;  // nanoseconds since 1970
+  std::int64_t changed = 0;   // status change (ctime), nanoseconds since 1970
+  bool operator==(const VelFileStamp&) const = default;
+};
+VelFileStamp velFileStamp(const std::string& path);
+
+// A regular file read whole in one go, with the identity of exactly the bytes read: a
+// reader that keeps the identity needs no second reading, and a version written between
+// two readings cannot pass for the one parsed.
+struct VelFileContent {
+  std::unique_ptr<char[]> data;  // size bytes, then a NUL
+  std::size_t size = 0;
+  bool opened = false;
+  // exists and readable as velFileIdentity has them; readable is false for anything but a
+  // regular file and for one that ends before the size it announced.
+  VelFileIdentity identity;
+  int error = 0;  // the system's error code of a failed open or read
+};
+VelFileContent velReadFile(const std::string& path);
+
+// What another module read. velReadFile leaves, for its thread, the identity of the last
+// file it read: the caller of a module that reads a file of its own format through it
+// learns which version that module parsed, without reading the file a second time, which
+// would cost as much again and could meet a version written in between. Take a mark
+// before the call; after it, velFileReadSince answers the identity of `path` (named
+// exactly as the module was given it) when the last file velReadFile read in this thread
+// since the mark was that one. It answers false when the module read nothing through
+// velReadFile, read another file last, or read in another thread: the caller then has to
+// tell the version another way.
+std::uint64_t velFileReadMark();
+bool velFileReadSince(std::uint64_t mark, const std::string& path, VelFileIdentity& identity);
 
 // An advisory lock (fcntl, on the open file) on "<folder>/.<name>.verrou", which
 // outlives the replacements of the file itself; held from construction to destruction.

@@ -9,16 +9,14 @@
 #include <pugixml.hpp>
 
 #include <algorithm>
+#include <bit>
 #include <cerrno>
 #include <charconv>
 #include <climits>
 #include <cmath>
 #include <cstdint>
 #include <cstring>
-#include <fcntl.h>
 #include <filesystem>
-#include <sys/stat.h>
-#include <unistd.h>
 #include <unordered_map>
 
 namespace metre {
@@ -130,32 +128,33 @@ inline std::size_t FieldOf(const char* name, std::size_t expected, std::string_v
 
 // Digits only, with an optional minus: the form of nearly every number in a file, read
 // without from_chars. Anything else answers false and takes the general path.
-bool ReadPlainInteger(const char* text, bool& negative, std::uint64_t& value, int maxDigits)
+bool ReadPlainInteger(std::string_view text, bool& negative, std::uint64_t& value, std::size_t maxDigits)
 {
-    negative = *text == '-';
+    negative = !text.empty() && text.front() == '-';
     if (negative)
-        ++text;
+        text.remove_prefix(1);
+    if (text.empty() || text.size() > maxDigits)
+        return false;
     value = 0;
-    int digits = 0;
-    for (; *text >= '0' && *text <= '9'; ++text, ++digits) {
-        if (digits == maxDigits)
+    for (const char c : text) {
+        if (c < '0' || c > '9')
             return false;
-        value = value * 10 + static_cast<unsigned>(*text - '0');
+        value = value * 10 + static_cast<unsigned>(c - '0');
     }
-    return digits != 0 && *text == '\0';
+    return true;
 }
 
 // SetFieldText for a value of the file, with the common forms read directly; the rules
 // stay those of SetFieldText, which takes every other case.
-bool SetFieldValue(CZodEVIArticle& article, const CZodEVIArticleField& field, const char* value)
+bool SetFieldValue(CZodEVIArticle& article, const CZodEVIArticleField& field, std::string_view value)
 {
     bool negative = false;
     std::uint64_t n = 0;
     switch (field.type) {
     case CZodEVIArticleField::Type::Text:
         // Most texts of a file are empty, and a field is read once, still empty.
-        if (*value != '\0')
-            article.*field.text = value;
+        if (!value.empty())
+            (article.*field.text).assign(value.data(), value.size());
         return true;
     case CZodEVIArticleField::Type::Real:
         // Up to 15 digits a whole number is exact as a double; "-0" stays negative.
@@ -164,9 +163,10 @@ bool SetFieldValue(CZodEVIArticle& article, const CZodEVIArticleField& field, co
             return true;
         }
         // Whatever from_chars reads whole, ParseReal reads the same.
-        if (const char* end = value + std::strlen(value); end != value) {
+        if (!value.empty()) {
             double real = 0;
-            const auto result = std::from_chars(value, end, real);
+            const char* end = value.data() + value.size();
+            const auto result = std::from_chars(value.data(), end, real);
             if (result.ec == std::errc() && result.ptr == end) {
                 article.*field.real = real;
                 return true;
@@ -398,10 +398,242 @@ std::string FieldText(const CZodEVIArticle& article, const CZodEVIArticleField& 
 
 namespace {
 
+// The schedule as this module writes it, read straight from the text without a document
+// in between: the declaration, the root, self-closed <article> elements whose attributes
+// are known fields in double quotes, the escapes the writer makes, whitespace between.
+// Whatever else a file holds (comments, other escapes or quotes, any fault) makes it
+// answer false with `out` untouched, and the document reader takes the file, with its
+// messages. Where it answers true, the articles are those the document reader makes.
+class DirectReader {
+public:
+    explicit DirectReader(std::string_view text)
+        : p_(text.data()), end_(text.data() + text.size()), openings_(Openings())
+    {
+    }
+
+    bool Read(ArticleVector& out)
+    {
+        if (!Take(kDeclaration))
+            return false;
+        SkipSpace();
+        if (!Take("<bordereau"))
+            return false;
+        ArticleVector read;
+        if (Take(">")) {
+            for (;;) {
+                SkipSpace();
+                if (Take("</bordereau>"))
+                    break;
+                if (!Take("<article") || p_ == end_ || !IsSpace(*p_))
+                    return false;
+                read.push_back(std::make_unique<CZodEVIArticle>());
+                if (!Attributes(*read.back()))
+                    return false;
+            }
+        } else {
+            SkipSpace();
+            if (!Take("/>"))
+                return false;
+        }
+        SkipSpace();
+        if (p_ != end_)
+            return false;
+        out.reserve(out.size() + read.size());
+        out.insert(out.end(), std::make_move_iterator(read.begin()), std::make_move_iterator(read.end()));
+        return true;
+    }
+
+private:
+    static constexpr char kDeclaration[] = "<?xml version=\"1.0\" encoding=\"UTF-8\"?>";
+
+    // ' name="' of a field as two words and the masks of its bytes, so that the field
+    // expected next is recognised by two comparisons.
+    struct Opening {
+        std::uint64_t word[2] = {};
+        std::uint64_t mask[2] = {};
+        std::size_t length = 0;
+    };
+    static const std::array<Opening, 48>& Openings()
+    {
+        static const std::array<Opening, 48> openings = [] {
+            std::array<Opening, 48> all{};
+            for (std::size_t i = 0; i < all.size(); ++i) {
+                const std::string text = std::string(ArticleFields()[i].name) + "=\"";
+                unsigned char bytes[16] = {};
+                unsigned char mask[16] = {};
+                all[i].length = std::min<std::size_t>(text.size(), 16);
+                std::memcpy(bytes, text.data(), all[i].length);
+                std::memset(mask, 0xFF, all[i].length);
+                std::memcpy(all[i].word, bytes, 16);
+                std::memcpy(all[i].mask, mask, 16);
+                // A longer name is never taken on the quick path.
+                if (text.size() > 16)
+                    all[i].length = 0;
+            }
+            return all;
+        }();
+        return openings;
+    }
+
+    static bool IsSpace(char c) { return c == ' ' || c == '\n' || c == '\r' || c == '\t'; }
+    // The characters of a name as the document reader scans it.
+    static bool IsNameStart(char c)
+    {
+        const auto u = static_cast<unsigned char>(c);
+        return (u >= 'a' && u <= 'z') || (u >= 'A' && u <= 'Z') || u == '_' || u == ':' || u >= 128;
+    }
+    static bool IsNameChar(char c) { return IsNameStart(c) || (c >= '0' && c <= '9') || c == '-' || c == '.'; }
+
+    void SkipSpace()
+    {
+        const char* p = p_;
+        while (p != end_ && IsSpace(*p))
+            ++p;
+        p_ = p;
+    }
+    // A literal: its length is known here, so that the comparison is a few instructions.
+    template <std::size_t N>
+    bool Take(const char (&text)[N])
+    {
+        constexpr std::size_t length = N - 1;
+        if (static_cast<std::size_t>(end_ - p_) < length || std::memcmp(p_, text, length) != 0)
+            return false;
+        p_ += length;
+        return true;
+    }
+
+    // The field whose ' name="' starts here, past it; fields.size() for any other text.
+    std::size_t Field(std::size_t expected)
+    {
+        if (expected < openings_.size() && end_ - p_ >= 16) {
+            const Opening& opening = openings_[expected];
+            std::uint64_t word[2];
+            std::memcpy(word, p_, 16);
+            if (opening.length != 0 && (word[0] & opening.mask[0]) == opening.word[0] &&
+                (word[1] & opening.mask[1]) == opening.word[1]) {
+                p_ += opening.length;
+                return expected;
+            }
+        }
+        const char* start = p_;
+        if (p_ == end_ || !IsNameStart(*p_))
+            return openings_.size();
+        while (p_ != end_ && IsNameChar(*p_))
+            ++p_;
+        const std::string_view name(start, static_cast<std::size_t>(p_ - start));
+        if (!Take("=\""))
+            return openings_.size();
+        const auto found = FieldIndex().find(name);
+        return found == FieldIndex().end() ? openings_.size() : found->second;
+    }
+
+    // The first '"', '&' or NUL from p on, or end: eight bytes at a time, the bytes equal
+    // to one of them found as the zero bytes of a word.
+    static const char* Special(const char* p, const char* end)
+    {
+        constexpr std::uint64_t kOnes = 0x0101010101010101ULL;
+        constexpr std::uint64_t kHighs = 0x8080808080808080ULL;
+        const auto zeroes = [](std::uint64_t w) { return (w - kOnes) & ~w & kHighs; };
+        for (; end - p >= 8; p += 8) {
+            std::uint64_t w;
+            std::memcpy(&w, p, 8);
+            // The lowest flagged byte is always a true one: the order of a little-endian word.
+            if (const std::uint64_t found = zeroes(w) | zeroes(w ^ (kOnes * '"')) | zeroes(w ^ (kOnes * '&')))
+                return p + std::countr_zero(found) / 8;
+        }
+        while (p != end && *p != '"' && *p != '&' && *p != '\0')
+            ++p;
+        return p;
+    }
+
+    // The value up to its closing quote, past it, its escapes replaced; false for a value
+    // the writer does not make.
+    bool Value(std::string_view& value)
+    {
+        const char* start = p_;
+        p_ = Special(p_, end_);
+        if (p_ != end_ && *p_ == '"') {
+            value = std::string_view(start, static_cast<std::size_t>(p_++ - start));
+            return true;
+        }
+        scratch_.assign(start, p_);
+        for (;;) {
+            if (p_ == end_ || *p_ == '\0')
+                return false;
+            if (*p_ == '"') {
+                ++p_;
+                value = scratch_;
+                return true;
+            }
+            if (!Escape())
+                return false;
+            start = p_;
+            p_ = Special(p_, end_);
+            scratch_.append(start, p_);
+        }
+    }
+
+    // One escape at '&' onto the scratch text: the named ones, and a character reference
+    // of one to three decimal digits for an ASCII character other than NUL (the control
+    // characters the writer escapes).
+    bool Escape()
+    {
+        if (Take("&#")) {
+            unsigned code = 0;
+            int digits = 0;
+            for (; p_ != end_ && *p_ >= '0' && *p_ <= '9' && digits < 3; ++p_, ++digits)
+                code = code * 10 + static_cast<unsigned>(*p_ - '0');
+            if (digits == 0 || !Take(";") || code == 0 || code > 127)
+                return false;
+            scratch_ += static_cast<char>(code);
+            return true;
+        }
+        const char c = Take("&quot;") ? '"'
+                     : Take("&amp;")  ? '&'
+                     : Take("&lt;")   ? '<'
+                     : Take("&gt;")   ? '>'
+                     : Take("&apos;") ? '\''
+                                      : '\0';
+        if (c == '\0')
+            return false;
+        scratch_ += c;
+        return true;
+    }
+
+    // From the whitespace after "<article" to past its "/>".
+    bool Attributes(CZodEVIArticle& article)
+    {
+        const auto& fields = ArticleFields();
+        std::uint64_t seen = 0;
+        std::size_t expected = 0;
+        for (;;) {
+            SkipSpace();
+            if (p_ != end_ && *p_ == '/')
+                return Take("/>");
+            const std::size_t position = Field(expected);
+            if (position == fields.size() || (seen & (std::uint64_t{1} << position)) != 0)
+                return false;
+            seen |= std::uint64_t{1} << position;
+            std::string_view value;
+            if (!Value(value) || !SetFieldValue(article, fields[position], value))
+                return false;
+            expected = position + 1;
+            // The next attribute or the end, never glued to the quote.
+            if (p_ == end_ || (!IsSpace(*p_) && *p_ != '/'))
+                return false;
+        }
+    }
+
+    const char* p_;
+    const char* const end_;
+    const std::array<Opening, 48>& openings_;
+    std::string scratch_;
+};
+
 // Parses `buffer` in place (pugixml writes into it) and appends its articles to `out`
 // when all of it reads. Messages count lines in `text`, the buffer as it was.
-FileResult ReadArticles(char* buffer, std::size_t size, std::string_view text, const std::string& name,
-                        ArticleVector& out)
+FileResult ParseArticles(char* buffer, std::size_t size, std::string_view text, const std::string& name,
+                         ArticleVector& out)
 {
     pugi::xml_document document;
     const pugi::xml_parse_result parsed =
@@ -415,6 +647,12 @@ FileResult ReadArticles(char* buffer, std::size_t size, std::string_view text, c
                                                 "ce fichier n'est pas un bordereau.",
                                                 name.c_str(), LineOfOffset(text, root.offset_debug()), kScheduleRoot,
                                                 root.name()));
+    // Articles past the end of the root would be lost at the next write.
+    if (const pugi::xml_node other = root.next_sibling())
+        return FileResult::Failure(FormatString("Bordereau « %s », ligne %d : élément <%s> après la fin de <%s> ; un "
+                                                "bordereau n'a qu'un élément racine.",
+                                                name.c_str(), LineOfOffset(text, other.offset_debug()), other.name(),
+                                                kScheduleRoot));
     const auto& fields = ArticleFields();
     const auto& packedNames = PackedNames();
     const std::string_view parsedText(buffer, size);
@@ -464,39 +702,48 @@ FileResult ReadArticles(char* buffer, std::size_t size, std::string_view text, c
     return {};
 }
 
-// The whole file in one piece, not zeroed first: large schedules are read many times a
-// session.
-FileResult ReadWholeFile(const std::string& path, std::unique_ptr<char[]>& data, std::size_t& size)
+// The articles of the text in `buffer`: read directly when it is as the writer makes it,
+// otherwise parsed in place by pugixml (see ParseArticles).
+FileResult ReadArticles(char* buffer, std::size_t size, std::string_view text, const std::string& name,
+                        ArticleVector& out)
+{
+    if (DirectReader(std::string_view(buffer, size)).Read(out))
+        return {};
+    return ParseArticles(buffer, size, text, name, out);
+}
+
+// The whole file in one piece, through the host, which keeps the identity of the bytes
+// read for the caller of this module.
+FileResult ReadWholeFile(const std::string& path, VelFileContent& content)
 {
     std::error_code error;
     if (!std::filesystem::exists(path, error))
         return FileResult::Failure(FormatString("Bordereau « %s » : fichier introuvable.", path.c_str()));
     if (std::filesystem::is_directory(path, error))
         return FileResult::Failure(FormatString("Bordereau « %s » : c'est un dossier, pas un fichier.", path.c_str()));
-    const int fd = ::open(path.c_str(), O_RDONLY | O_CLOEXEC);
-    if (fd < 0)
+    content = velReadFile(path);
+    if (!content.opened)
         return FileResult::Failure(FormatString("Bordereau « %s » : ouverture impossible (%s).", path.c_str(),
-                                                ErrnoText(errno).c_str()));
-    struct stat status {};
+                                                ErrnoText(content.error).c_str()));
     // Only a regular file has a size to read.
-    bool whole = ::fstat(fd, &status) == 0 && S_ISREG(status.st_mode);
-    size = whole ? static_cast<std::size_t>(status.st_size) : 0;
-    data = std::make_unique_for_overwrite<char[]>(size + 1);
-    std::size_t done = 0;
-    while (whole && done < size) {
-        const ssize_t got = ::read(fd, data.get() + done, size - done);
-        if (got < 0 && errno == EINTR)
-            continue;
-        whole = got > 0;
-        done += whole ? static_cast<std::size_t>(got) : 0;
-    }
-    ::close(fd);
-    if (!whole)
+    if (!content.identity.readable)
         return FileResult::Failure(FormatString("Bordereau « %s » : lecture impossible.", path.c_str()));
     return {};
 }
 
 } // namespace
+
+bool ReadScheduleDirectly(std::string_view text, ArticleVector& out)
+{
+    return DirectReader(text).Read(out);
+}
+
+FileResult ReadScheduleDocument(std::string_view text, const std::string& name, ArticleVector& out)
+{
+    auto copy = std::make_unique_for_overwrite<char[]>(text.size() + 1);
+    std::memcpy(copy.get(), text.data(), text.size());
+    return ParseArticles(copy.get(), text.size(), text, name, out);
+}
 
 FileResult ReadScheduleText(std::string_view text, const std::string& name, ArticleVector& out)
 {
@@ -507,17 +754,16 @@ FileResult ReadScheduleText(std::string_view text, const std::string& name, Arti
 
 FileResult ReadScheduleFile(const std::string& path, ArticleVector& out)
 {
-    std::unique_ptr<char[]> data;
-    std::size_t size = 0;
-    if (FileResult read = ReadWholeFile(path, data, size); !read)
+    VelFileContent content;
+    if (FileResult read = ReadWholeFile(path, content); !read)
         return read;
-    if (ReadArticles(data.get(), size, std::string_view(data.get(), size), path, out))
+    if (ReadArticles(content.data.get(), content.size, std::string_view(content.data.get(), content.size), path, out))
         return {};
     // Parsing in place rewrote the text its lines were to be counted in: the message
     // comes from a second reading of the file, which errors alone pay for.
-    if (FileResult read = ReadWholeFile(path, data, size); !read)
+    if (FileResult read = ReadWholeFile(path, content); !read)
         return read;
-    return ReadScheduleText(std::string_view(data.get(), size), path, out);
+    return ReadScheduleText(std::string_view(content.data.get(), content.size), path, out);
 }
 
 std::string ScheduleToXml(const std::vector<const CZodEVIArticle*>& articles)

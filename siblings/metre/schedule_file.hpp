@@ -38,6 +38,12 @@ FileResult ReadScheduleFile(const std::string& path, ArticleVector& out);
 // Same from text in memory; `name` stands for the file in messages.
 FileResult ReadScheduleText(std::string_view text, const std::string& name, ArticleVector& out);
 
+// The two readings behind ReadScheduleText, for the checks that compare them: the direct
+// one takes only a file as this module writes it (false for any other, `out` untouched),
+// the document one any XML, with the messages.
+bool ReadScheduleDirectly(std::string_view text, ArticleVector& out);
+FileResult ReadScheduleDocument(std::string_view text, const std::string& name, ArticleVector& out);
+
 // The file's text for these articles, in their order.
 std::string ScheduleToXml(const std::vector<const CZodEVIArticle*>& articles);
 

@@ -6,6 +6,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <chrono>
 #include <cstring>
@@ -160,6 +161,86 @@ std::uint64_t Mix(std::uint64_t h) {
   h ^= h >> 33;
   h *= 0xc4ceb9fe1a85ec53ULL;
   return h ^ (h >> 33);
+}
+
+// The hash of a file's bytes, fed in pieces of any size. Four lanes of eight bytes each
+// take every fourth word, so that the multiplications of neighbouring words overlap and
+// the hash keeps up with reading; each word is multiplied and rotated into its lane, so
+// that swapped or shifted bytes tell. The length is mixed in at the end.
+class ContentHash {
+ public:
+  void update(const char* data, std::size_t size) {
+    total_ += size;
+    if (pendingSize_ > 0) {
+      const std::size_t take = std::min(size, kStripe - pendingSize_);
+      std::memcpy(pending_ + pendingSize_, data, take);
+      pendingSize_ += take;
+      data += take;
+      size -= take;
+      if (pendingSize_ < kStripe) return;
+      stripes(pending_, kStripe);
+      pendingSize_ = 0;
+    }
+    const std::size_t whole = size - size % kStripe;
+    stripes(data, whole);
+    std::memcpy(pending_, data + whole, size - whole);
+    pendingSize_ = size - whole;
+  }
+
+  std::uint64_t final() const {
+    ContentHash last = *this;
+    if (last.pendingSize_ > 0) {
+      std::memset(last.pending_ + last.pendingSize_, 0, kStripe - last.pendingSize_);
+      last.stripes(last.pending_, kStripe);
+    }
+    std::uint64_t h = last.total_;
+    for (const std::uint64_t lane : last.lane_) h = Mix(h ^ lane) + kPrime1;
+    return Mix(h);
+  }
+
+ private:
+  static constexpr std::size_t kStripe = 32;
+  static constexpr std::uint64_t kPrime1 = 0x9e3779b185ebca87ULL;
+  static constexpr std::uint64_t kPrime2 = 0xc2b2ae3d27d4eb4fULL;
+
+  static std::uint64_t Round(std::uint64_t lane, std::uint64_t word) {
+    lane += word * kPrime2;
+    return ((lane << 31) | (lane >> 33)) * kPrime1;
+  }
+
+  void stripes(const char* data, std::size_t size) {
+    std::uint64_t a = lane_[0], b = lane_[1], c = lane_[2], d = lane_[3];
+    for (std::size_t i = 0; i < size; i += kStripe) {
+      std::uint64_t w[4];
+      std::memcpy(w, data + i, kStripe);
+      a = Round(a, w[0]);
+      b = Round(b, w[1]);
+      c = Round(c, w[2]);
+      d = Round(d, w[3]);
+    }
+    lane_[0] = a, lane_[1] = b, lane_[2] = c, lane_[3] = d;
+  }
+
+  std::uint64_t lane_[4] = {kPrime1 + kPrime2, kPrime2, 0, 0 - kPrime1};
+  char pending_[kStripe] = {};
+  std::size_t pendingSize_ = 0;
+  std::uint64_t total_ = 0;
+};
+
+std::int64_t ModifiedOf(const struct stat& st) {
+  return static_cast<std::int64_t>(st.st_mtim.tv_sec) * 1000000000 + st.st_mtim.tv_nsec;
+}
+
+// The last file that velReadFile read in this thread.
+struct LastRead {
+  std::uint64_t count = 0;
+  std::string path;
+  VelFileIdentity identity;
+};
+
+LastRead& LastReadOfThread() {
+  static thread_local LastRead last;
+  return last;
 }
 
 }  // namespace
@@ -338,11 +419,10 @@ VelFileIdentity velFileIdentity(const std::string& path) {
     ::close(fd);
     return identity;
   }
-  identity.modified = static_cast<std::int64_t>(st.st_mtim.tv_sec) * 1000000000 + st.st_mtim.tv_nsec;
-  // Eight bytes at a time, each step mixed so that swapped or shifted bytes tell.
-  std::uint64_t hash = 0x9e3779b97f4a7c15ULL;
+  identity.modified = ModifiedOf(st);
+  ContentHash hash;
   std::uint64_t size = 0;
-  alignas(8) unsigned char buffer[1 << 16];
+  char buffer[1 << 16];
   for (;;) {
     const ssize_t n = ::read(fd, buffer, sizeof buffer);
     if (n < 0 && errno == EINTR) continue;
@@ -351,19 +431,85 @@ VelFileIdentity velFileIdentity(const std::string& path) {
       break;
     }
     if (n == 0) break;
-    std::size_t i = 0;
-    for (; i + 8 <= static_cast<std::size_t>(n); i += 8) {
-      std::uint64_t word;
-      std::memcpy(&word, buffer + i, 8);
-      hash = Mix(hash ^ word) + size + i;
-    }
-    for (; i < static_cast<std::size_t>(n); ++i) hash = Mix(hash ^ buffer[i]) + size + i;
+    hash.update(buffer, static_cast<std::size_t>(n));
     size += static_cast<std::uint64_t>(n);
   }
   ::close(fd);
   identity.size = size;
-  identity.hash = Mix(hash ^ size);
+  identity.hash = hash.final();
   return identity;
+}
+
+VelFileStamp velFileStamp(const std::string& path) {
+  VelFileStamp stamp;
+  struct stat st {};
+  if (::stat(path.c_str(), &st) != 0) return stamp;
+  stamp.exists = true;
+  stamp.device = static_cast<std::uint64_t>(st.st_dev);
+  stamp.inode = static_cast<std::uint64_t>(st.st_ino);
+  stamp.size = static_cast<std::uint64_t>(st.st_size);
+  stamp.modified = ModifiedOf(st);
+  stamp.changed = static_cast<std::int64_t>(st.st_ctim.tv_sec) * 1000000000 + st.st_ctim.tv_nsec;
+  return stamp;
+}
+
+VelFileContent velReadFile(const std::string& path) {
+  VelFileContent content;
+  VelFileIdentity& identity = content.identity;
+  const int fd = ::open(path.c_str(), O_RDONLY | O_CLOEXEC);
+  if (fd < 0) {
+    content.error = errno;
+    identity.exists = content.error != ENOENT && content.error != ENOTDIR;
+    identity.readable = false;
+  } else {
+    content.opened = true;
+    identity.exists = true;
+    struct stat st {};
+    if (::fstat(fd, &st) != 0) {
+      content.error = errno;
+      identity.readable = false;
+    } else if (!S_ISREG(st.st_mode)) {
+      identity.readable = false;
+    }
+    const std::size_t size = identity.readable ? static_cast<std::size_t>(st.st_size) : 0;
+    content.data = std::make_unique_for_overwrite<char[]>(size + 1);
+    // Hashed piece by piece as read, while the piece is still in the cache; the size the
+    // file announced is what is read.
+    constexpr std::size_t kPiece = std::size_t{1} << 20;
+    ContentHash hash;
+    std::size_t done = 0;
+    while (identity.readable && done < size) {
+      const ssize_t got = ::read(fd, content.data.get() + done, std::min(kPiece, size - done));
+      if (got < 0 && errno == EINTR) continue;
+      if (got <= 0) {
+        content.error = got < 0 ? errno : 0;
+        identity.readable = false;
+        break;
+      }
+      hash.update(content.data.get() + done, static_cast<std::size_t>(got));
+      done += static_cast<std::size_t>(got);
+    }
+    ::close(fd);
+    content.size = done;
+    content.data[done] = '\0';
+    identity.modified = ModifiedOf(st);
+    identity.size = done;
+    identity.hash = hash.final();
+  }
+  LastRead& last = LastReadOfThread();
+  ++last.count;
+  last.path = path;
+  last.identity = identity;
+  return content;
+}
+
+std::uint64_t velFileReadMark() { return LastReadOfThread().count; }
+
+bool velFileReadSince(std::uint64_t mark, const std::string& path, VelFileIdentity& identity) {
+  const LastRead& last = LastReadOfThread();
+  if (last.count <= mark || last.path != path) return false;
+  identity = last.identity;
+  return true;
 }
 
 // ---- lock ----

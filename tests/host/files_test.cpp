@@ -7,8 +7,11 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <cerrno>
 #include <filesystem>
 #include <fstream>
+#include <random>
+#include <string_view>
 
 #include "file_faults.hpp"
 #include "temp_dir.hpp"
@@ -185,6 +188,7 @@ TEST(VelFileIdentity, ContentTellsVersionsApart)
         {"same size, one digit", "prix=12.51", false},
         {"two bytes swapped", "prix=21.50", false},
         {"empty", "", false},
+        {"a NUL more", std::string("prix=12.50", 11), false},
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.name);
@@ -195,6 +199,44 @@ TEST(VelFileIdentity, ContentTellsVersionsApart)
     EXPECT_FALSE(missing.exists);
     EXPECT_TRUE(missing.sameContent(velFileIdentity(dir.File("autre.xml"))));
     EXPECT_FALSE(missing.sameContent(velFileIdentity(dir.Write("vide.xml", ""))));
+}
+
+// The file read whole carries the identity of its bytes, the same as velFileIdentity
+// gives, whatever pieces either reads and hashes; and it is known to whoever asks after.
+TEST(VelReadFile, BytesAndTheirIdentityAsVelFileIdentityHasThem)
+{
+    TempDir dir;
+    std::mt19937 random(7);
+    // About the hash's stripes of 32 bytes and the pieces of both readers.
+    for (const std::size_t size : {0, 1, 31, 32, 33, 65535, 65536, 65569, (1 << 20) + 7, (3 << 20) + 100}) {
+        SCOPED_TRACE(size);
+        std::string content(size, '\0');
+        for (char& c : content)
+            c = static_cast<char>(random());
+        const std::string path = dir.Write("f.bin", content);
+        const std::uint64_t mark = velFileReadMark();
+        const VelFileContent read = velReadFile(path);
+        ASSERT_TRUE(read.opened);
+        EXPECT_TRUE(read.identity.readable);
+        ASSERT_EQ(read.size, size);
+        EXPECT_TRUE(std::string_view(read.data.get(), read.size) == content);
+        EXPECT_EQ(read.data[size], '\0');
+        const VelFileIdentity identity = velFileIdentity(path);
+        EXPECT_EQ(read.identity.hash, identity.hash);
+        EXPECT_TRUE(read.identity.sameContent(identity));
+        VelFileIdentity seen;
+        ASSERT_TRUE(velFileReadSince(mark, path, seen));
+        EXPECT_EQ(seen.hash, identity.hash);
+        EXPECT_FALSE(velFileReadSince(mark, dir.File("autre.bin"), seen)) << "another file";
+        EXPECT_FALSE(velFileReadSince(velFileReadMark(), path, seen)) << "nothing read since";
+    }
+    const VelFileContent folder = velReadFile(dir.path.string());
+    EXPECT_TRUE(folder.identity.exists);
+    EXPECT_FALSE(folder.identity.readable);
+    const VelFileContent missing = velReadFile(dir.File("absent.bin"));
+    EXPECT_FALSE(missing.opened);
+    EXPECT_FALSE(missing.identity.exists);
+    EXPECT_EQ(missing.error, ENOENT);
 }
 
 TEST(VelFileLock, SharedInProcessExclusiveBetweenProcesses)

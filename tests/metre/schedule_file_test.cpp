@@ -249,6 +249,8 @@ TEST(ScheduleFile, MalformedFilesAreRefusedWithTheirLine)
         {"unknown field", "<bordereau>\n<article prix=\"1\"/>\n</bordereau>", "ligne 2 : article 1, champ inconnu « prix »"},
         {"twice", "<bordereau>\n<article code=\"A\" code=\"B\"/>\n</bordereau>", "champ « code » en double"},
         {"stray element", "<bordereau>\n<article/>\n<ligne/>\n</bordereau>", "ligne 3 : élément <article> attendu, <ligne>"},
+        {"article after the root", "<bordereau>\n<article/>\n</bordereau>\n<article code=\"B\"/>\n",
+         "ligne 4 : élément <article> après la fin de <bordereau> ; un bordereau n'a qu'un élément racine"},
         {"truncated", "<bordereau>\n<article code=\"A\"/>\n<article code=\"B\"", "ligne 3"},
         // Reading rewrites escapes and name ends in place; lines are those of the file.
         {"lines after escapes", "<bordereau>\n<article\ncode=\"a&#10;b&#10;c&#10;\"\n/>\n<article prix=\"1\"/>\n</bordereau>",
@@ -268,6 +270,102 @@ TEST(ScheduleFile, MalformedFilesAreRefusedWithTheirLine)
         EXPECT_EQ(out.size(), 1u) << "a refused file delivers nothing";
         if (c.content) {
             EXPECT_EQ(dir.Read(std::string(c.name) + ".xml"), c.content);
+        }
+    }
+}
+
+std::string Replaced(std::string text, std::string_view from, std::string_view to)
+{
+    const std::size_t at = text.find(from);
+    EXPECT_NE(at, std::string::npos) << from;
+    return at == std::string::npos ? text : text.replace(at, from.size(), to);
+}
+
+// A file as the module writes it is read straight from its text; any other form (a file
+// edited by hand, a fault) is left to the document reading, which gives the articles or
+// the message. Both readings agree wherever the direct one reads.
+TEST(ScheduleFile, DirectReadingAgreesWithTheDocumentOrStandsAside)
+{
+    const CZodEVIArticle first = Tricky(0), second = Tricky(3);
+    const std::string written = metre::ScheduleToXml({&first, &second});
+    const std::string declaration = "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n";
+    const auto one = [&](const std::string& article) {
+        return declaration + "<bordereau>\n  " + article + "\n</bordereau>\n";
+    };
+    std::string crlf;
+    for (const char c : written)
+        crlf += c == '\n' ? std::string("\r\n") : std::string(1, c);
+    struct Case {
+        const char* name;
+        std::string text;
+        bool direct; // read straight from the text
+        bool reads;
+    } cases[] = {
+        {"as written", written, true, true},
+        {"empty, as written", metre::ScheduleToXml({}), true, true},
+        {"empty root closed apart", declaration + "<bordereau>\n</bordereau>", true, true},
+        {"CRLF line ends", crlf, true, true},
+        {"fields in another order, tabs", one("<article\tunit=\"m²\"\tcode=\"A\" nature=\"3\"\n/>"), true, true},
+        {"raw > and ' in values", one("<article code=\"a>b\" unit=\"'m'\" />"), true, true},
+        {"numbers in other forms", one("<article unitPrice=\"1e5\" number=\"-0\" taxRate=\"-0\" />"), true, true},
+        {"no attribute", one("<article />"), true, true},
+        {"comment", Replaced(written, "<bordereau>\n", "<bordereau>\n<!-- prix négociés -->\n"), false, true},
+        {"single quotes", one("<article code='A' />"), false, true},
+        {"spaces around =", one("<article code = \"A\" />"), false, true},
+        {"unknown escape", one("<article code=\"D&eacute;blais\" />"), false, true},
+        {"hexadecimal reference", one("<article code=\"&#xE9;\" />"), false, true},
+        {"reference beyond ASCII", one("<article code=\"&#233;&#8364;\" />"), false, true},
+        {"reference to NUL", one("<article code=\"a&#0;b\" />"), false, true},
+        {"reference with four digits", one("<article code=\"&#0065;\" />"), false, true},
+        {"entity of a doctype", Replaced(written, "<bordereau>", "<!DOCTYPE bordereau [<!ENTITY p \"12\">]>\n<bordereau>"),
+         false, true},
+        {"BOM", "\xEF\xBB\xBF" + written, false, true},
+        {"no declaration", written.substr(declaration.size()), false, true},
+        {"other declaration", Replaced(written, "encoding=\"UTF-8\"", "encoding='UTF-8' standalone=\"yes\""), false,
+         true},
+        {"element without space", one("<article/>"), false, true},
+        {"element closed apart", one("<article code=\"A\"></article>"), false, true},
+        {"end tag with space", Replaced(written, "</bordereau>", "</bordereau >"), false, true},
+        {"CDATA in an article", one("<article code=\"A\"><![CDATA[x]]></article>"), false, true},
+        {"duplicate attribute", one("<article code=\"A\" code=\"B\" />"), false, false},
+        {"unknown field", one("<article prix=\"1\" />"), false, false},
+        {"bad number", one("<article unitPrice=\"12,5\" />"), false, false},
+        {"int too large", one("<article number=\"3000000000\" />"), false, false},
+        {"attributes glued", one("<article code=\"A\"unit=\"m\" />"), false, false},
+        {"NUL in a value", one(std::string("<article code=\"a") + '\0' + "b\" />"), false, false},
+        {"other root", Replaced(written, "bordereau>", "devis>"), false, false},
+        {"text between articles", Replaced(written, "  <article", "prix <article"), false, false},
+        {"element in an article", one("<article code=\"A\"><prix/></article>"), false, false},
+        {"text after the root", written + "fin\n", false, true},
+        {"second root", written + "<bordereau />\n", false, false},
+        {"truncated", written.substr(0, written.size() / 2), false, false},
+    };
+    TempDir dir;
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.name);
+        ArticleVector direct, document, read, fromFile;
+        direct.push_back(std::make_unique<CZodEVIArticle>());
+        EXPECT_EQ(metre::ReadScheduleDirectly(c.text, direct), c.direct);
+        const metre::FileResult byDocument = metre::ReadScheduleDocument(c.text, "b.xml", document);
+        EXPECT_EQ(static_cast<bool>(byDocument), c.reads) << byDocument.message;
+        if (!c.direct) {
+            EXPECT_EQ(direct.size(), 1u) << "a text left to the document reading is not read in part";
+        }
+        direct.erase(direct.begin());
+        const metre::FileResult result = metre::ReadScheduleText(c.text, "b.xml", read);
+        EXPECT_EQ(result.ok, byDocument.ok);
+        EXPECT_EQ(result.message, byDocument.message);
+        // The file goes through the reading in place, which messages count lines apart from.
+        const std::string path = dir.Write("b.xml", c.text);
+        const metre::FileResult fileResult = metre::ReadScheduleFile(path, fromFile);
+        EXPECT_EQ(fileResult.ok, byDocument.ok);
+        EXPECT_EQ(fileResult.ok ? fileResult.message : Replaced(fileResult.message, path, "b.xml"), byDocument.message);
+        for (const ArticleVector* other : {&direct, &read, &fromFile}) {
+            if (other == &direct && !c.direct)
+                continue;
+            ASSERT_EQ(other->size(), document.size());
+            for (std::size_t i = 0; i < document.size(); ++i)
+                ExpectSameFields(*document[i], *(*other)[i]);
         }
     }
 }

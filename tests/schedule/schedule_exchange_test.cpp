@@ -5,14 +5,18 @@
 
 #include "module/siblings.hpp"
 #include "text/text.hpp"
+#include "velhost/files.h"
 #include "velhost/rx.h"
 #include "velhost/ui.h"
 
 #include <gtest/gtest.h>
 
 #include "support/session.hpp"
+#include "support/temp_dir.hpp"
 
 #include <algorithm>
+#include <deque>
+#include <functional>
 #include <sstream>
 
 namespace {
@@ -25,11 +29,14 @@ struct FakeMetre {
     std::int32_t editorAnswer = 0;
     std::vector<std::pair<CZodEVIArticle, std::uint32_t>> editorChanges;
     std::string editorLabel;
+    std::function<void(const std::string&)> duringFill; // what else happens while the file is read
 };
 FakeMetre* g_fake = nullptr;
 
-std::int32_t FakeFill(std::string, std::vector<CZodEVIArticle*>* table, std::int32_t)
+std::int32_t FakeFill(std::string path, std::vector<CZodEVIArticle*>* table, std::int32_t)
 {
+    if (g_fake->duringFill)
+        g_fake->duringFill(path);
     for (const CZodEVIArticle& article : g_fake->file) {
         table->push_back(new CZodEVIArticle(article));
         if (g_fake->failAfterPartialRead && table->size() == 2)
@@ -166,6 +173,48 @@ TEST_F(ScheduleExchange, MissingMetreModuleFailsEveryCall)
     EXPECT_FALSE(Write(bdr));
     EXPECT_FALSE(Edit(bdr, ""));
     velRegisterInProcessService(kMetreService, new AcRxService(), {});
+}
+
+// The version a write compares the file with is the one the metre module read, whether
+// the module reads through the host (which tells which bytes it read) or not: another
+// program's version written meanwhile is never taken for it and overwritten.
+TEST_F(ScheduleExchange, VersionReadIsTheOneTheWriteComparesWith)
+{
+    struct Case {
+        const char* name;
+        bool throughHost;
+        bool changedMeanwhile;
+    } cases[] = {
+        {"read through the host", true, false},
+        {"through the host, another version written just after its reading", true, true},
+        {"read by the module itself", false, false},
+        {"by the module itself, another version written meanwhile", false, true},
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.name);
+        TempDir dir;
+        const std::string theirs = "version écrite par un autre poste, plus longue";
+        bdr.path = dir.Write("VelaBordereau.xml", "version lue");
+        fake.writes = 0;
+        fake.duringFill = [&](const std::string& path) {
+            if (c.throughHost) {
+                EXPECT_TRUE(velReadFile(path).opened);
+            }
+            if (c.changedMeanwhile)
+                dir.Write("VelaBordereau.xml", theirs);
+        };
+        ASSERT_TRUE(Read(bdr));
+        fake.duringFill = nullptr;
+        output.str("");
+        EXPECT_EQ(Write(bdr), !c.changedMeanwhile) << output.str();
+        EXPECT_EQ(fake.writes, c.changedMeanwhile ? 0 : 1);
+        if (c.changedMeanwhile) {
+            EXPECT_NE(output.str().find("a été modifié par un autre utilisateur ou programme depuis sa lecture"),
+                      std::string::npos)
+                << output.str();
+            EXPECT_EQ(dir.Read("VelaBordereau.xml"), theirs);
+        }
+    }
 }
 
 TEST_F(ScheduleExchange, PricesBySelector)

@@ -149,12 +149,23 @@ void PrintNotRead(const CZodEVIBdr& bdr)
                path.c_str(), bdr.fileState.notReadReason.c_str(), path.c_str());
 }
 
-// The metre module's articles of a file. `before` is the file's identity taken first:
-// a version written while the module reads is then seen as a change at the next write.
+// The metre module's articles of a file. `before` is the identity of the version it
+// read: the host tells it, having hashed the bytes the module read; a version written
+// meanwhile is then seen as a change at the next write. For a reader that does not read
+// through the host, the file as it is after the reading stands for it, or, when it
+// changed during the reading, an identity that matches no version.
 bool ReadArticles(const std::string& path, ReturnedArticles& delivered, VelFileIdentity& before)
 {
+    const std::uint64_t mark = velFileReadMark();
+    const VelFileStamp stamp = velFileStamp(path);
+    const bool read =
+        CallMetre<VtMetre_RemplitTableauFn>("VtMetre_RemplitTableau", std::string(path), &delivered.list, 1) == 0;
+    if (velFileReadSince(mark, path, before))
+        return read;
     before = velFileIdentity(path);
-    return CallMetre<VtMetre_RemplitTableauFn>("VtMetre_RemplitTableau", std::string(path), &delivered.list, 1) == 0;
+    if (read && before.exists && velFileStamp(path) != stamp)
+        before.readable = false;
+    return read;
 }
 
 void AddProjectWideArticles(CZodEVIBdr& bdr);

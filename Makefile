@@ -37,8 +37,11 @@ test: deps
 	cd $(ASAN_BUILD) && ctest --output-on-failure -j$(JOBS)
 	$(MAKE) fuzz
 
+# The fuzz and benchmark trees, named apart from the folders of the tree in $(BUILD).
+FUZZ_BUILD ?= build/fuzz-tree
+BENCH_BUILD ?= build/bench-tree
+
 # A short bounded run of each reader's fuzz target (clang, libFuzzer) from its seeds.
-FUZZ_BUILD ?= build/fuzz
 FUZZ_SECONDS ?= 20
 FUZZ_TARGETS = dxf_reader schedule_reader ini_reader registry_reader script_input project_record
 FUZZ_SEEDS_dxf_reader = tests/data/dxf/fuzz tests/data/dxf
@@ -66,9 +69,9 @@ demo: build
 	@echo "  Devis 2.xlsx, Devis 2.csv  le devis du seul réseau EU, quantités sommées"
 
 bench: deps
-	cmake -S . -B build/bench -DCMAKE_BUILD_TYPE=Release -DVEL_BENCH=ON
-	cmake --build build/bench -j$(JOBS)
-	@for b in build/bench/bin/bench_*; do [ -x "$$b" ] && "$$b"; done
+	cmake -S . -B $(BENCH_BUILD) -DCMAKE_BUILD_TYPE=Release -DVEL_BENCH=ON
+	cmake --build $(BENCH_BUILD) -j$(JOBS)
+	@for b in $(BENCH_BUILD)/bin/bench_*; do [ -x "$$b" ] && "$$b"; done
 
 clean:
 	rm -rf $(BUILD)

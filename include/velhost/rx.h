@@ -26,6 +26,13 @@ enum AppRetCode { kRetOK = 0, kRetError = 3 };
 // Signature of the entry point every module exports (extern "C").
 using AcRxEntryPointFn = AcRx::AppRetCode (*)(AcRx::AppMsgCode message, void* appId);
 
+// Release of the host's module interface that these headers describe.
+inline constexpr int kAcRxApiVersion = 15;
+// Signature of acrxGetApiVersion, which every module exports (extern "C") and answers
+// the release it was built for. The kit supplies it (velhost_module, which
+// vel_add_module links): a module does not write it.
+using AcRxGetApiVersionFn = int (*)();
+
 // Base of everything the host files in its dictionaries.
 class AcRxObject {
  public:
@@ -71,9 +78,10 @@ using VelSymbolTable = std::map<std::string, void*, std::less<>>;
 class AcRxDynamicLinker : public AcRxObject {
  public:
   const char* className() const override;
-  // dlopen, then acrxEntryPoint(kInitAppMsg, appId). A module that cannot be opened,
-  // lacks acrxEntryPoint or refuses to start is closed again and a message says which.
-  // A module already loaded answers true without a second start. printit prints the
+  // dlopen, acrxGetApiVersion, then acrxEntryPoint(kInitAppMsg, appId). A module that
+  // cannot be found or opened, lacks one of the two symbols, was built for another
+  // release of the interface or refuses to start is closed again, and a message says
+  // which step failed. A module already loaded answers true without a second start. printit prints the
   // success message; asCmd marks a load asked for by the user (only used in messages).
   bool loadModule(const char* fileName, bool printit, bool asCmd = false);
   // kUnloadAppMsg, then dlclose. A locked module (one that never called

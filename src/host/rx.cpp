@@ -283,6 +283,26 @@ bool AcRxDynamicLinker::loadModule(const char* fileName, bool printit, bool asCm
     acutPrintf("Impossible d'ouvrir le module %s : %s\n", path.c_str(), why ? why : "?");
     return false;
   }
+  // Nothing of a module built for another interface is called: its objects and
+  // messages would not mean what this host means by them.
+  const auto version = reinterpret_cast<AcRxGetApiVersionFn>(dlsym(module->handle, "acrxGetApiVersion"));
+  if (version == nullptr) {
+    acutPrintf("Le module %s n'exporte pas acrxGetApiVersion : on ne sait pas pour quelle version de l'interface "
+               "de l'hôte il est écrit ; il n'est pas chargé.\n",
+               path.c_str());
+    return false;
+  }
+  int release = 0;
+  {
+    VelAppScope scope(module);
+    release = version();
+  }
+  if (release != kAcRxApiVersion) {
+    acutPrintf("Le module %s est écrit pour la version %d de l'interface de l'hôte, et cet hôte est de la "
+               "version %d : il n'est pas chargé.\n",
+               path.c_str(), release, kAcRxApiVersion);
+    return false;
+  }
   module->entry = reinterpret_cast<AcRxEntryPointFn>(dlsym(module->handle, "acrxEntryPoint"));
   if (module->entry == nullptr) {
     acutPrintf("Le module %s n'exporte pas de point d'entrée acrxEntryPoint.\n", path.c_str());

@@ -42,12 +42,17 @@ TEST_F(DynamicLinker, LoadFailuresSayWhichStepFailed)
         {"absent_module.arx", "Impossible de trouver le module absent_module.arx."},
         {"entryless_module.arx", "n'exporte pas de point d'entrée acrxEntryPoint"},
         {"refusing_module.arx", "a refusé de démarrer (réponse 3)"},
+        {"old_release_module.arx", "old_release_module.arx est écrit pour la version 14 de l'interface de l'hôte, "
+                                   "et cet hôte est de la version 15 : il n'est pas chargé."},
+        {"versionless_module.arx", "versionless_module.arx n'exporte pas acrxGetApiVersion"},
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.name);
         session.ClearOutput();
         EXPECT_FALSE(acrxLoadModule(c.name, false));
         EXPECT_NE(session.Output().find(c.expected), std::string::npos) << session.Output();
+        // A module of another release is never started.
+        EXPECT_EQ(session.Output().find("entry point called"), std::string::npos);
     }
     EXPECT_TRUE(velLoadedModules().empty());
     // What the refusing module registered before refusing went with it.

@@ -56,12 +56,6 @@ Library g_library;
 
 } // namespace
 
-// The host interface release the module is written for.
-extern "C" __attribute__((visibility("default"))) int acrxGetApiVersion()
-{
-    return 15;
-}
-
 extern "C" __attribute__((visibility("default"))) AcRx::AppRetCode acrxEntryPoint(AcRx::AppMsgCode message,
                                                                                   void* packet)
 {

@@ -116,6 +116,11 @@ void* acrxGetServiceSymbolAddr(const char* serviceName, const char* symbolName);
 void velRegisterInProcessService(const char* serviceName, AcRxService* service,
                                  VelSymbolTable symbols);
 
+// Takes serviceName out of "ServiceDictionary" only while service is what is filed there,
+// so that nobody removes a service that another filed since under that name; answers
+// whether it did. The caller still owns service.
+bool velUnregisterService(const char* serviceName, const AcRxService* service);
+
 // Full path of the module whose code the host is running (entry point or command);
 // "" when the host itself is running.
 const char* acedGetAppName();

@@ -13,10 +13,7 @@ public:
     const char* className() const override { return "CVelMetreService"; }
 };
 
-AcRxDictionary* ServiceDictionary()
-{
-    return static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"));
-}
+CVelMetreService* g_service = nullptr;
 
 } // namespace
 
@@ -26,10 +23,15 @@ extern "C" __attribute__((visibility("default"))) AcRx::AppRetCode acrxEntryPoin
     case AcRx::kInitAppMsg:
         acrxDynamicLinker()->unlockApplication(appId);
         acrxDynamicLinker()->registerAppMDIAware(appId);
-        acrxDynamicLinker()->registerService(kMetreServiceName, new CVelMetreService());
+        if (g_service == nullptr) {
+            g_service = new CVelMetreService();
+            acrxDynamicLinker()->registerService(kMetreServiceName, g_service);
+        }
         break;
     case AcRx::kUnloadAppMsg:
-        delete ServiceDictionary()->remove(kMetreServiceName);
+        velUnregisterService(kMetreServiceName, g_service);
+        delete g_service;
+        g_service = nullptr;
         break;
     default:
         break;

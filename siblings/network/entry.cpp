@@ -22,11 +22,7 @@ CVelReseDimSrv* g_service = nullptr;
 
 void RemoveService()
 {
-    if (g_service == nullptr)
-        return;
-    AcRxDictionary* services = static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"));
-    if (services != nullptr && services->at(kServiceName) == g_service)
-        services->remove(kServiceName);
+    velUnregisterService(kServiceName, g_service);
     delete g_service;
     g_service = nullptr;
 }

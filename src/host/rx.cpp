@@ -445,6 +445,15 @@ void velRegisterInProcessService(const char* serviceName, AcRxService* service,
   State().services[serviceName] = std::move(owner);
 }
 
+bool velUnregisterService(const char* serviceName, const AcRxService* service) {
+  if (serviceName == nullptr || service == nullptr || ServiceDictionary()->at(serviceName) != service) return false;
+  ServiceDictionary()->remove(serviceName);
+  auto& services = State().services;
+  const auto owner = services.find(std::string_view(serviceName));
+  if (owner != services.end() && owner->second.service == service) services.erase(owner);
+  return true;
+}
+
 const char* acedGetAppName() {
   static std::string name;
   name = velAppPath(velCurrentApp());

@@ -163,6 +163,33 @@ TEST(ServiceDictionary, InProcessServiceAnswersItsTable)
     EXPECT_EQ(acrxGetServiceSymbolAddr("VelTestInProcess", "Marker"), nullptr);
 }
 
+TEST(ServiceDictionary, UnregisterTakesOnlyTheCallersService)
+{
+    static AcRxService mine, theirs;
+    velRegisterInProcessService("VelTestShared", &mine, {});
+    // Another filed its own service under the name since.
+    velRegisterInProcessService("VelTestShared", &theirs, {});
+    struct Case {
+        const char* what;
+        const char* name;
+        const AcRxService* service;
+        bool removed;
+        bool registeredAfter;
+    };
+    const Case cases[] = {
+        {"no longer mine", "VelTestShared", &mine, false, true},
+        {"no name", nullptr, &theirs, false, true},
+        {"no service", "VelTestShared", nullptr, false, true},
+        {"still theirs", "VelTestShared", &theirs, true, false},
+        {"already gone", "VelTestShared", &theirs, false, false},
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.what);
+        EXPECT_EQ(velUnregisterService(c.name, c.service), c.removed);
+        EXPECT_EQ(acrxServiceIsRegistered("VelTestShared"), c.registeredAfter);
+    }
+}
+
 TEST(Abort, HandlerReceivesTheFormattedMessage)
 {
     AbortCatcher catcher;

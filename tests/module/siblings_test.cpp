@@ -81,7 +81,7 @@ TEST_F(Siblings, RegisteredServiceNeedsNoFile)
     EXPECT_EQ(GetServiceSymbol(nullptr, "VelTestSibling", "Marqueur"), &marker);
     EXPECT_EQ(GetServiceObject("Absent.arx", "VelTestSibling"), &service);
     EXPECT_EQ(session.Output(), "");
-    static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"))->remove("VelTestSibling");
+    velUnregisterService("VelTestSibling", &service);
 }
 
 TEST_F(Siblings, MissingNamesAnswerNothingWithoutSearching)
@@ -173,9 +173,8 @@ TEST_F(Siblings, ForwardersAnswerOneWhenTheFunctionIsMissing)
     EXPECT_EQ(out, 9);
     EXPECT_EQ(sibling::Rsx_WriteXDataMetres(), 5);
     EXPECT_EQ(sibling::VtMetre_SymbMonetaire(&text), 1);
-    auto* dict = static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"));
-    dict->remove(kMetreService);
-    dict->remove(kNetworkService);
+    velUnregisterService(kMetreService, &metre);
+    velUnregisterService(kNetworkService, &network);
 }
 
 } // namespace

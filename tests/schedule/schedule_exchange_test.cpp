@@ -75,7 +75,7 @@ protected:
     void SetUp() override
     {
         g_fake = &fake;
-        velRegisterInProcessService(kMetreService, new AcRxService(),
+        velRegisterInProcessService(kMetreService, &metre,
                                     {{"VtMetre_RemplitTableau", reinterpret_cast<void*>(&FakeFill)},
                                      {"VtMetre_ExporterXml", reinterpret_cast<void*>(&FakeExport)},
                                      {"VtMetre_EditerBordereau", reinterpret_cast<void*>(&FakeEdit)}});
@@ -84,7 +84,7 @@ protected:
     void TearDown() override
     {
         velSetUI(previousUI);
-        delete static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"))->remove(kMetreService);
+        velUnregisterService(kMetreService, &metre);
         g_fake = nullptr;
     }
     std::size_t TemplatesOfKind(int kind)
@@ -100,6 +100,7 @@ protected:
     }
 
     FakeMetre fake;
+    AcRxService metre;
     CZodEVIBdr bdr;
     std::istringstream script;
     std::ostringstream output;
@@ -152,12 +153,11 @@ TEST_F(ScheduleExchange, FailedPartialReadLeavesStoreEmpty)
 
 TEST_F(ScheduleExchange, MissingMetreModuleFailsEveryCall)
 {
-    delete static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"))->remove(kMetreService);
+    velUnregisterService(kMetreService, &metre);
     EXPECT_FALSE(Read(bdr));
     EXPECT_TRUE(bdr.Articles().empty());
     EXPECT_FALSE(Write(bdr));
     EXPECT_FALSE(Edit(bdr, ""));
-    velRegisterInProcessService(kMetreService, new AcRxService(), {});
 }
 
 TEST_F(ScheduleExchange, PricesBySelector)

@@ -98,9 +98,8 @@ protected:
 
     void TearDown() override
     {
-        auto* services = static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"));
-        services->remove(kNetworkService);
-        services->remove(kMetreService);
+        velUnregisterService(kNetworkService, &network);
+        velUnregisterService(kMetreService, &metre);
         acDocManagerPtr()->closeDocument(document);
     }
 

@@ -77,12 +77,14 @@ CVelSrvModul::~CVelSrvModul()
 {
     // Normally gone with Unload; a module detached without it must not leave its service
     // filed under a deleted object.
-    if (service != nullptr) {
-        auto* services = static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"));
-        if (services != nullptr && services->at(kZodEVIServiceName) == service)
-            services->remove(kZodEVIServiceName);
-        delete service;
-    }
+    RemoveService();
+}
+
+void CVelSrvModul::RemoveService()
+{
+    velUnregisterService(kZodEVIServiceName, service);
+    delete service;
+    service = nullptr;
 }
 
 AcRx::AppRetCode CVelSrvModul::OnAppMessage(AcRx::AppMsgCode message, void* packet)
@@ -145,13 +147,7 @@ void CVelSrvModul::Unload()
     if (acrxServiceIsRegistered(kMainService) && !MainServices()->UnloadQuery())
         MainServices()->UnregisterModule(moduleName);
     acedRegCmds()->removeGroup(kZodEVICommandGroup);
-    if (acrxServiceIsRegistered(kZodEVIServiceName)) {
-        auto* services = static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"));
-        if (services != nullptr)
-            services->remove(kZodEVIServiceName);
-        delete service;
-        service = nullptr;
-    }
+    RemoveService();
 }
 
 int CVelSrvModul::ListGroupCommands(const std::string& group, const char* lineFormat,

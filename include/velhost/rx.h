@@ -107,6 +107,24 @@ bool acrxUnloadModule(const char* fileName, bool asCmd = false);
 
 bool acrxServiceIsRegistered(const char* serviceName);
 
+// How velLoadServiceModule went.
+struct VelServiceModule {
+  enum Status {
+    kRegistered,  // the service was there: nothing was searched
+    kLoaded,      // the module was found, loaded, and registered the service
+    kNotFound,    // no candidate file was found
+    kNotLoaded,   // the file was found but did not load (the loader said why)
+    kNoService,   // the module loaded without registering the service
+  };
+  Status status = kNotFound;
+  std::string path;  // the module file found, "" when none was
+  explicit operator bool() const { return status == kRegistered || status == kLoaded; }
+};
+
+// Makes sure a sibling's service is registered: when it is not, the first of the
+// candidate file names that acedFindFile finds is loaded (printing, as a command).
+VelServiceModule velLoadServiceModule(const char* serviceName, const std::vector<std::string>& candidates);
+
 // Address of symbolName in the module that registered serviceName (or in the table of a
 // service registered in-process); null when either is unknown.
 void* acrxGetServiceSymbolAddr(const char* serviceName, const char* symbolName);

@@ -418,6 +418,24 @@ bool acrxServiceIsRegistered(const char* serviceName) {
   return serviceName != nullptr && ServiceDictionary()->has(serviceName);
 }
 
+VelServiceModule velLoadServiceModule(const char* serviceName, const std::vector<std::string>& candidates) {
+  VelServiceModule result;
+  if (acrxServiceIsRegistered(serviceName)) {
+    result.status = VelServiceModule::kRegistered;
+    return result;
+  }
+  for (const std::string& candidate : candidates)
+    if (acedFindFile(candidate.c_str(), result.path) == RTNORM) break;
+  if (result.path.empty()) {
+    result.status = VelServiceModule::kNotFound;
+  } else if (!acrxLoadModule(result.path.c_str(), true, true)) {
+    result.status = VelServiceModule::kNotLoaded;
+  } else {
+    result.status = acrxServiceIsRegistered(serviceName) ? VelServiceModule::kLoaded : VelServiceModule::kNoService;
+  }
+  return result;
+}
+
 void* acrxGetServiceSymbolAddr(const char* serviceName, const char* symbolName) {
   if (serviceName == nullptr || symbolName == nullptr || *symbolName == '\0') return nullptr;
   auto it = State().services.find(std::string_view(serviceName));

@@ -147,6 +147,30 @@ TEST_F(DynamicLinker, AbortDuringStartUpLeavesNothingLoaded)
     EXPECT_TRUE(velLoadedModules().empty());
 }
 
+TEST_F(DynamicLinker, ServiceModuleLoadSaysHowItWent)
+{
+    struct Case {
+        const char* service;
+        std::vector<std::string> candidates;
+        VelServiceModule::Status status;
+        const char* path;
+    };
+    const Case cases[] = {
+        {"VelTestGoodService", {"absent_module.arx", "good_module.arx"}, VelServiceModule::kLoaded, "good_module.arx"},
+        // Now there: nothing is searched.
+        {"VelTestGoodService", {"absent_module.arx"}, VelServiceModule::kRegistered, nullptr},
+        {"VelTestOther", {"absent_module.arx"}, VelServiceModule::kNotFound, nullptr},
+        {"VelTestOther", {"refusing_module.arx"}, VelServiceModule::kNotLoaded, "refusing_module.arx"},
+        {"VelTestOther", {"sloppy_module.arx"}, VelServiceModule::kNoService, "sloppy_module.arx"},
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.candidates.back());
+        const VelServiceModule module = velLoadServiceModule(c.service, c.candidates);
+        EXPECT_EQ(module.status, c.status);
+        EXPECT_EQ(module.path, c.path ? ModulePath(c.path) : "");
+    }
+}
+
 TEST(ServiceDictionary, InProcessServiceAnswersItsTable)
 {
     static AcRxService service;

@@ -3,7 +3,7 @@
 #include "module/siblings.hpp"
 
 #include "text/text.hpp"
-#include "velhost/editor.h"
+#include "velsiblings/module_search.h"
 
 namespace {
 
@@ -29,19 +29,9 @@ void* GetServiceSymbol(const char* moduleFile, const char* serviceName, const ch
     if (!acrxServiceIsRegistered(serviceName)) {
         if (moduleFile == nullptr || *moduleFile == '\0')
             return nullptr;
-        const char* extension = HasArxExtension(moduleFile) ? "" : ".arx";
-        const std::string candidates[] = {
-            FormatString("%s%s", moduleFile, extension),
-            FormatString("..\\Programmes\\%s%s", moduleFile, extension),
-            FormatString("Programmes\\%s%s", moduleFile, extension),
-        };
-        for (const std::string& candidate : candidates) {
-            std::string found;
-            if (acedFindFile(candidate.c_str(), found) == RTNORM) {
-                acrxLoadModule(found.c_str(), true, true);
-                break;
-            }
-        }
+        const std::string file = moduleFile + std::string(HasArxExtension(moduleFile) ? "" : ".arx");
+        // A module that does not come leaves the symbol unknown; the loader has said why.
+        velLoadServiceModule(serviceName, VelModuleCandidates(file));
     }
     return acrxGetServiceSymbolAddr(serviceName, symbolName);
 }
@@ -50,22 +40,16 @@ AcRxObject* GetServiceObject(const char* moduleFile, const char* serviceName)
 {
     const std::string file = moduleFile ? moduleFile : "";
     const std::string service = serviceName ? serviceName : "";
-    if (!acrxServiceIsRegistered(service.c_str())) {
-        const std::string candidates[] = {file, "..\\Programmes\\" + file, "Programmes\\" + file};
-        std::string found;
-        bool located = false;
-        for (const std::string& candidate : candidates) {
-            if (acedFindFile(candidate.c_str(), found) == RTNORM) {
-                located = true;
-                break;
-            }
-        }
-        if (!located)
-            acrx_abort("Impossible de trouver le module <%s>!!!", file.c_str());
-        if (!acrxDynamicLinker()->loadModule(found.c_str(), true, true))
-            acrx_abort("Impossible de charger le module <%s>!!!", found.c_str());
-        if (!acrxServiceIsRegistered(service.c_str()))
-            acrx_abort("Pas de service <%s>\nenregistré par le module <%s>!!!", service.c_str(), found.c_str());
+    const VelServiceModule module = velLoadServiceModule(service.c_str(), VelModuleCandidates(file));
+    switch (module.status) {
+    case VelServiceModule::kNotFound:
+        acrx_abort("Impossible de trouver le module <%s>!!!", file.c_str());
+    case VelServiceModule::kNotLoaded:
+        acrx_abort("Impossible de charger le module <%s>!!!", module.path.c_str());
+    case VelServiceModule::kNoService:
+        acrx_abort("Pas de service <%s>\nenregistré par le module <%s>!!!", service.c_str(), module.path.c_str());
+    default:
+        break;
     }
     return ServiceDictionary()->at(service.c_str());
 }

@@ -73,7 +73,7 @@ void RegisterMetre()
     static bool done = false;
     if (done)
         return;
-    velRegisterInProcessService(kMetreService, new AcRxService(),
+    velRegisterInProcessService(kVelMetreServicesName, new AcRxService(),
                                 {{"VtMetre_RemplitTableau", reinterpret_cast<void*>(&Fill)},
                                  {"VtMetre_ExporterXml", reinterpret_cast<void*>(&Export)}});
     done = true;

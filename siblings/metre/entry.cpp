@@ -1,5 +1,5 @@
 // Entry point of the metre module and its six exported functions.
-#include "metre_exports.h"
+#include "velsiblings/metre_services.h"
 #include "metre_services.hpp"
 #include "schedule_editor.hpp"
 
@@ -25,11 +25,11 @@ extern "C" __attribute__((visibility("default"))) AcRx::AppRetCode acrxEntryPoin
         acrxDynamicLinker()->registerAppMDIAware(appId);
         if (g_service == nullptr) {
             g_service = new CVelMetreService();
-            acrxDynamicLinker()->registerService(kMetreServiceName, g_service);
+            acrxDynamicLinker()->registerService(kVelMetreServicesName, g_service);
         }
         break;
     case AcRx::kUnloadAppMsg:
-        velUnregisterService(kMetreServiceName, g_service);
+        velUnregisterService(kVelMetreServicesName, g_service);
         delete g_service;
         g_service = nullptr;
         break;

@@ -18,9 +18,6 @@
 
 namespace {
 
-using VtMetre_AfficherAssocFn = std::int32_t(std::string name, std::vector<CZodEVIAssocLine*>* lines,
-                                             std::int32_t show, std::int32_t mode);
-
 class MetreModule : public ::testing::Test {
 protected:
     void SetUp() override
@@ -29,7 +26,7 @@ protected:
         velHostSettings().profileDir = dir.path.string();
         previousUI = velSetUI(&ui);
         ASSERT_TRUE(acrxLoadModule(VEL_MODULE_DIR "/VelMetre15.arx", false));
-        ASSERT_TRUE(acrxServiceIsRegistered(kMetreService));
+        ASSERT_TRUE(acrxServiceIsRegistered(kVelMetreServicesName));
         bdr.path = dir.File("VelaBordereau.xml");
     }
     void TearDown() override

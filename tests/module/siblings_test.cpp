@@ -166,15 +166,17 @@ TEST_F(Siblings, ForwardersAnswerOneWhenTheFunctionIsMissing)
     EXPECT_TRUE(names.empty());
 
     static AcRxService metre, network;
-    velRegisterInProcessService(kMetreService, &metre, {{"VtMetre_ListeDesMetres", reinterpret_cast<void*>(&FakeList)}});
-    velRegisterInProcessService(kNetworkService, &network, {{"Rsx_WriteXDataMetres", reinterpret_cast<void*>(&FakeWrite)}});
+    velRegisterInProcessService(kVelMetreServicesName, &metre,
+                                {{"VtMetre_ListeDesMetres", reinterpret_cast<void*>(&FakeList)}});
+    velRegisterInProcessService(kVelNetworkServicesName, &network,
+                                {{"Rsx_WriteXDataMetres", reinterpret_cast<void*>(&FakeWrite)}});
     EXPECT_EQ(sibling::VtMetre_ListeDesMetres(&names, &out), 0);
     EXPECT_EQ(names, std::vector<std::string>{"Devis"});
     EXPECT_EQ(out, 9);
     EXPECT_EQ(sibling::Rsx_WriteXDataMetres(), 5);
     EXPECT_EQ(sibling::VtMetre_SymbMonetaire(&text), 1);
-    velUnregisterService(kMetreService, &metre);
-    velUnregisterService(kNetworkService, &network);
+    velUnregisterService(kVelMetreServicesName, &metre);
+    velUnregisterService(kVelNetworkServicesName, &network);
 }
 
 } // namespace

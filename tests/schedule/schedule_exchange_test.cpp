@@ -75,7 +75,7 @@ protected:
     void SetUp() override
     {
         g_fake = &fake;
-        velRegisterInProcessService(kMetreService, &metre,
+        velRegisterInProcessService(kVelMetreServicesName, &metre,
                                     {{"VtMetre_RemplitTableau", reinterpret_cast<void*>(&FakeFill)},
                                      {"VtMetre_ExporterXml", reinterpret_cast<void*>(&FakeExport)},
                                      {"VtMetre_EditerBordereau", reinterpret_cast<void*>(&FakeEdit)}});
@@ -84,7 +84,7 @@ protected:
     void TearDown() override
     {
         velSetUI(previousUI);
-        velUnregisterService(kMetreService, &metre);
+        velUnregisterService(kVelMetreServicesName, &metre);
         g_fake = nullptr;
     }
     std::size_t TemplatesOfKind(int kind)
@@ -153,7 +153,7 @@ TEST_F(ScheduleExchange, FailedPartialReadLeavesStoreEmpty)
 
 TEST_F(ScheduleExchange, MissingMetreModuleFailsEveryCall)
 {
-    velUnregisterService(kMetreService, &metre);
+    velUnregisterService(kVelMetreServicesName, &metre);
     EXPECT_FALSE(Read(bdr));
     EXPECT_TRUE(bdr.Articles().empty());
     EXPECT_FALSE(Write(bdr));

@@ -91,15 +91,15 @@ protected:
         FileRecord(named, "VELANTO_RSX_VRD", "PROJECTS", "EU 2", {{"\"RSX_TUY\"", 5}});
         named->close();
         document = acDocManagerPtr()->createDocument(std::move(db), "");
-        velRegisterInProcessService(kNetworkService, &network,
+        velRegisterInProcessService(kVelNetworkServicesName, &network,
                                     {{"Rsx_GetRsxFromType", reinterpret_cast<void*>(&FakeProjectsOfNetwork)}});
-        velRegisterInProcessService(kMetreService, &metre, {});
+        velRegisterInProcessService(kVelMetreServicesName, &metre, {});
     }
 
     void TearDown() override
     {
-        velUnregisterService(kNetworkService, &network);
-        velUnregisterService(kMetreService, &metre);
+        velUnregisterService(kVelNetworkServicesName, &network);
+        velUnregisterService(kVelMetreServicesName, &metre);
         acDocManagerPtr()->closeDocument(document);
     }
 

@@ -96,7 +96,8 @@ AcRx::AppRetCode CVelSrvModul::OnAppMessage(AcRx::AppMsgCode message, void* pack
         acrxDynamicLinker()->registerAppMDIAware(packet);
         if (Init() == 0)
             return AcRx::kRetError;
-        auto* config = static_cast<CVelConfigServices*>(GetServiceObject(kConfigModule, kConfigService));
+        auto* config =
+            static_cast<CVelConfigServices*>(GetServiceObject(kVelConfigServicesModule, kVelConfigServicesName));
         config->RegisterConfigPage("Métré", "Vel_ZodEVI_CfgUser", ModuleNameWithoutVersion(moduleName), "Métré");
         return AcRx::kRetOK;
     }
@@ -115,7 +116,7 @@ AcRx::AppRetCode CVelSrvModul::OnAppMessage(AcRx::AppMsgCode message, void* pack
 int CVelSrvModul::Init()
 {
     appPath = acedGetAppName();
-    if (!acrxServiceIsRegistered(kMainService)) {
+    if (!acrxServiceIsRegistered(kVelMainServicesName)) {
         const std::string text = FormatPattern(Message(505), {moduleName}) + Message(506) + "\n" + Message(507) +
                                  "\n" + Message(508);
         MessageBoxFlags(nullptr, MB_ICONERROR, "%s", text.c_str());
@@ -144,7 +145,7 @@ void CVelSrvModul::Unload()
 {
     acutPrintf("%s", FormatPattern(Message(503), {moduleName}).c_str());
     OnDrawingMessage();
-    if (acrxServiceIsRegistered(kMainService) && !MainServices()->UnloadQuery())
+    if (acrxServiceIsRegistered(kVelMainServicesName) && !MainServices()->UnloadQuery())
         MainServices()->UnregisterModule(moduleName);
     acedRegCmds()->removeGroup(kZodEVICommandGroup);
     RemoveService();

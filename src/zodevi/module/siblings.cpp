@@ -56,7 +56,7 @@ AcRxObject* GetServiceObject(const char* moduleFile, const char* serviceName)
 
 CVelMainServices* MainServices()
 {
-    return static_cast<CVelMainServices*>(GetServiceObject(kMainModule, kMainService));
+    return static_cast<CVelMainServices*>(GetServiceObject(kVelMainServicesModule, kVelMainServicesName));
 }
 
 namespace sibling {

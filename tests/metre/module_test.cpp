@@ -5,7 +5,7 @@
 #include "../host/temp_dir.hpp"
 #include "module/service_api.hpp"
 #include "module/siblings.hpp"
-#include "ui/config_page.hpp"
+#include "module/config_page.hpp"
 #include "velhost/documents.h"
 #include "velhost/profile.h"
 #include "velhost/rx.h"

@@ -5,9 +5,9 @@
 #include <algorithm>
 #include <memory>
 
-#include "module/parameters.hpp"
+#include "common/parameters.hpp"
+#include "module/schedule_commands.hpp"
 #include "module/siblings.hpp"
-#include "schedule/commands.hpp"
 #include "schedule/schedule_exchange.hpp"
 #include "text/text.hpp"
 #include "velhost/commands.h"

@@ -2,7 +2,7 @@
 // queries by quantity selector.
 #include "schedule/schedule_exchange.hpp"
 
-#include "module/parameters.hpp"
+#include "common/parameters.hpp"
 #include "module/siblings.hpp"
 #include "text/text.hpp"
 #include "velhost/editor.h"

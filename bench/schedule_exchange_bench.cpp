@@ -76,6 +76,7 @@ void RegisterMetre()
     velRegisterInProcessService(kVelMetreServicesName, new AcRxService(),
                                 {{"VtMetre_RemplitTableau", reinterpret_cast<void*>(&Fill)},
                                  {"VtMetre_ExporterXml", reinterpret_cast<void*>(&Export)}});
+    SetBdrMetre(&MetreModule());
     done = true;
 }
 

@@ -27,10 +27,12 @@ protected:
         previousUI = velSetUI(&ui);
         ASSERT_TRUE(acrxLoadModule(VEL_MODULE_DIR "/VelMetre15.arx", false));
         ASSERT_TRUE(acrxServiceIsRegistered(kVelMetreServicesName));
+        SetBdrMetre(&::MetreModule());
         bdr.path = dir.File("VelaBordereau.xml");
     }
     void TearDown() override
     {
+        SetBdrMetre(nullptr);
         acDocManager->closeAll();
         velUnloadAllModules();
         velSetUI(previousUI);

@@ -1,9 +1,9 @@
-// The exchange with the metre module, against an in-process stand-in whose answers each
+// The exchange with the metre module, against a stand-in whose answers each
 // test sets: reading with the project-wide articles, prices by selector, the editor's
 // changes and the faults of partial reads and regrouped modifications.
 #include "schedule/schedule_exchange.hpp"
 
-#include "module/siblings.hpp"
+#include "schedule/metre_link.hpp"
 #include "text/text.hpp"
 #include "velhost/rx.h"
 #include "velhost/ui.h"
@@ -15,8 +15,37 @@
 
 namespace {
 
-// What the stand-in metre module holds and answers.
-struct FakeMetre {
+// A metre module whose file and answers each test sets.
+struct FakeMetre final : CZodEVIBdrMetre {
+    std::int32_t FillTable(const std::string&, std::vector<CZodEVIArticle*>& table) override
+    {
+        for (const CZodEVIArticle& article : file) {
+            table.push_back(new CZodEVIArticle(article));
+            if (failAfterPartialRead && table.size() == 2)
+                return 1;
+        }
+        return 0;
+    }
+    std::int32_t ExportTable(const std::string&, std::vector<CZodEVIArticle*>& table) override
+    {
+        ++writes;
+        file.clear();
+        for (const CZodEVIArticle* article : table)
+            file.push_back(*article);
+        return 0;
+    }
+    std::int32_t EditSchedule(const std::string&, const std::string& treePath, std::vector<CZodEVIArticle*>& records,
+                              std::vector<std::uint32_t>& actions) override
+    {
+        editorLabel = treePath;
+        for (const auto& [article, kind] : editorChanges) {
+            records.push_back(new CZodEVIArticle(article));
+            actions.push_back(kind);
+        }
+        return editorAnswer;
+    }
+    std::int32_t CurrencySymbol(std::string&) override { return 1; }
+
     std::vector<CZodEVIArticle> file;
     bool failAfterPartialRead = false;
     int writes = 0;
@@ -24,37 +53,6 @@ struct FakeMetre {
     std::vector<std::pair<CZodEVIArticle, std::uint32_t>> editorChanges;
     std::string editorLabel;
 };
-FakeMetre* g_fake = nullptr;
-
-std::int32_t FakeFill(std::string, std::vector<CZodEVIArticle*>* table, std::int32_t)
-{
-    for (const CZodEVIArticle& article : g_fake->file) {
-        table->push_back(new CZodEVIArticle(article));
-        if (g_fake->failAfterPartialRead && table->size() == 2)
-            return 1;
-    }
-    return 0;
-}
-
-std::int32_t FakeExport(std::string, std::vector<CZodEVIArticle*>* table, std::int32_t)
-{
-    ++g_fake->writes;
-    g_fake->file.clear();
-    for (const CZodEVIArticle* article : *table)
-        g_fake->file.push_back(*article);
-    return 0;
-}
-
-std::int32_t FakeEdit(std::string, std::vector<CZodEVIArticle*>* records, std::vector<std::uint32_t>* actions,
-                      std::string label)
-{
-    g_fake->editorLabel = label;
-    for (const auto& [article, kind] : g_fake->editorChanges) {
-        records->push_back(new CZodEVIArticle(article));
-        actions->push_back(kind);
-    }
-    return g_fake->editorAnswer;
-}
 
 CZodEVIArticle Article(const std::string& code, const std::string& key, const std::string& group,
                        const std::string& treePath, double price = 0, int nature = 2)
@@ -74,18 +72,13 @@ class ScheduleExchange : public ::testing::Test {
 protected:
     void SetUp() override
     {
-        g_fake = &fake;
-        velRegisterInProcessService(kVelMetreServicesName, &metre,
-                                    {{"VtMetre_RemplitTableau", reinterpret_cast<void*>(&FakeFill)},
-                                     {"VtMetre_ExporterXml", reinterpret_cast<void*>(&FakeExport)},
-                                     {"VtMetre_EditerBordereau", reinterpret_cast<void*>(&FakeEdit)}});
+        SetBdrMetre(&fake);
         previousUI = velSetUI(&ui);
     }
     void TearDown() override
     {
         velSetUI(previousUI);
-        velUnregisterService(kVelMetreServicesName, &metre);
-        g_fake = nullptr;
+        SetBdrMetre(nullptr);
     }
     std::size_t TemplatesOfKind(int kind)
     {
@@ -100,7 +93,6 @@ protected:
     }
 
     FakeMetre fake;
-    AcRxService metre;
     CZodEVIBdr bdr;
     std::istringstream script;
     std::ostringstream output;
@@ -153,7 +145,7 @@ TEST_F(ScheduleExchange, FailedPartialReadLeavesStoreEmpty)
 
 TEST_F(ScheduleExchange, MissingMetreModuleFailsEveryCall)
 {
-    velUnregisterService(kVelMetreServicesName, &metre);
+    SetBdrMetre(nullptr);
     EXPECT_FALSE(Read(bdr));
     EXPECT_TRUE(bdr.Articles().empty());
     EXPECT_FALSE(Write(bdr));

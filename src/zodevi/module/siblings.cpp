@@ -88,3 +88,31 @@ std::int32_t VtMetre_AfficherAssoc(const std::string& name, std::vector<CZodEVIA
 }
 
 } // namespace sibling
+
+namespace {
+
+class MetreServices final : public CZodEVIBdrMetre {
+public:
+    std::int32_t FillTable(const std::string& file, std::vector<CZodEVIArticle*>& table) override
+    {
+        return CallMetre<VtMetre_RemplitTableauFn>("VtMetre_RemplitTableau", file, &table, 1);
+    }
+    std::int32_t ExportTable(const std::string& file, std::vector<CZodEVIArticle*>& table) override
+    {
+        return CallMetre<VtMetre_ExporterXmlFn>("VtMetre_ExporterXml", file, &table, 1);
+    }
+    std::int32_t EditSchedule(const std::string& file, const std::string& treePath,
+                              std::vector<CZodEVIArticle*>& records, std::vector<std::uint32_t>& actions) override
+    {
+        return CallMetre<VtMetre_EditerBordereauFn>("VtMetre_EditerBordereau", file, &records, &actions, treePath);
+    }
+    std::int32_t CurrencySymbol(std::string& symbol) override { return sibling::VtMetre_SymbMonetaire(&symbol); }
+};
+
+} // namespace
+
+CZodEVIBdrMetre& MetreModule()
+{
+    static MetreServices metre;
+    return metre;
+}

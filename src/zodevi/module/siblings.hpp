@@ -8,6 +8,7 @@
 #include <utility>
 #include <vector>
 
+#include "schedule/metre_link.hpp"
 #include "velhost/rx.h"
 #include "velsiblings/config_services.h"
 #include "velsiblings/main_services.h"
@@ -62,3 +63,7 @@ std::int32_t VtMetre_SymbMonetaire(std::string* symbol);
 std::int32_t VtMetre_AfficherAssoc(const std::string& name, std::vector<CZodEVIAssocLine*>* lines, std::int32_t show,
                                    std::int32_t mode);
 } // namespace sibling
+
+// The metre module as the schedule takes it: its exported functions, reached through its
+// service (loading the module on demand), 1 when missing.
+CZodEVIBdrMetre& MetreModule();

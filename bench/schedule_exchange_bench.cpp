@@ -87,9 +87,10 @@ void RegisterMetre()
     static bool done = false;
     if (done)
         return;
-    velRegisterInProcessService(kMetreService, new AcRxService(),
+    velRegisterInProcessService(kVelMetreServicesName, new AcRxService(),
                                 {{"VtMetre_RemplitTableau", reinterpret_cast<void*>(&Fill)},
                                  {"VtMetre_ExporterXml", reinterpret_cast<void*>(&Export)}});
+    SetBdrMetre(&MetreModule());
     done = true;
 }
 

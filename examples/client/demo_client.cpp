@@ -7,6 +7,7 @@
 #include "text/text.hpp"
 #include "velhost/commands.h"
 #include "velhost/editor.h"
+#include "velhost/rx.h"
 #include "zodevi/api.h"
 
 namespace {
@@ -17,11 +18,7 @@ constexpr const char* kGroup = "VELANTO_DEMO_PRIX";
 template <class Fn>
 Fn* ScheduleFunction(const char* name)
 {
-    if (!acrxServiceIsRegistered(kZodEVIServiceName)) {
-        std::string found;
-        if (acedFindFile(kZodEVIModuleFile, found) == RTNORM)
-            acrxLoadModule(found.c_str(), true, true);
-    }
+    velLoadServiceModule(kZodEVIServiceName, {kZodEVIModuleFile});
     return reinterpret_cast<Fn*>(acrxGetServiceSymbolAddr(kZodEVIServiceName, name));
 }
 

@@ -26,6 +26,13 @@ enum AppRetCode { kRetOK = 0, kRetError = 3 };
 // Signature of the entry point every module exports (extern "C").
 using AcRxEntryPointFn = AcRx::AppRetCode (*)(AcRx::AppMsgCode message, void* appId);
 
+// Release of the host's module interface that these headers describe.
+inline constexpr int kAcRxApiVersion = 15;
+// Signature of acrxGetApiVersion, which every module exports (extern "C") and answers
+// the release it was built for. The kit supplies it (velhost_module, which
+// vel_add_module links): a module does not write it.
+using AcRxGetApiVersionFn = int (*)();
+
 // Base of everything the host files in its dictionaries.
 class AcRxObject {
  public:
@@ -71,9 +78,10 @@ using VelSymbolTable = std::map<std::string, void*, std::less<>>;
 class AcRxDynamicLinker : public AcRxObject {
  public:
   const char* className() const override;
-  // dlopen, then acrxEntryPoint(kInitAppMsg, appId). A module that cannot be opened,
-  // lacks acrxEntryPoint or refuses to start is closed again and a message says which.
-  // A module already loaded answers true without a second start. printit prints the
+  // dlopen, acrxGetApiVersion, then acrxEntryPoint(kInitAppMsg, appId). A module that
+  // cannot be found or opened, lacks one of the two symbols, was built for another
+  // release of the interface or refuses to start is closed again, and a message says
+  // which step failed. A module already loaded answers true without a second start. printit prints the
   // success message; asCmd marks a load asked for by the user (only used in messages).
   bool loadModule(const char* fileName, bool printit, bool asCmd = false);
   // kUnloadAppMsg, then dlclose. A locked module (one that never called
@@ -99,6 +107,24 @@ bool acrxUnloadModule(const char* fileName, bool asCmd = false);
 
 bool acrxServiceIsRegistered(const char* serviceName);
 
+// How velLoadServiceModule went.
+struct VelServiceModule {
+  enum Status {
+    kRegistered,  // the service was there: nothing was searched
+    kLoaded,      // the module was found, loaded, and registered the service
+    kNotFound,    // no candidate file was found
+    kNotLoaded,   // the file was found but did not load (the loader said why)
+    kNoService,   // the module loaded without registering the service
+  };
+  Status status = kNotFound;
+  std::string path;  // the module file found, "" when none was
+  explicit operator bool() const { return status == kRegistered || status == kLoaded; }
+};
+
+// Makes sure a sibling's service is registered: when it is not, the first of the
+// candidate file names that acedFindFile finds is loaded (printing, as a command).
+VelServiceModule velLoadServiceModule(const char* serviceName, const std::vector<std::string>& candidates);
+
 // Address of symbolName in the module that registered serviceName (or in the table of a
 // service registered in-process); null when either is unknown.
 void* acrxGetServiceSymbolAddr(const char* serviceName, const char* symbolName);
@@ -107,6 +133,11 @@ void* acrxGetServiceSymbolAddr(const char* serviceName, const char* symbolName);
 // host itself stand in for a sibling module.
 void velRegisterInProcessService(const char* serviceName, AcRxService* service,
                                  VelSymbolTable symbols);
+
+// Takes serviceName out of "ServiceDictionary" only while service is what is filed there,
+// so that nobody removes a service that another filed since under that name; answers
+// whether it did. The caller still owns service.
+bool velUnregisterService(const char* serviceName, const AcRxService* service);
 
 // Full path of the module whose code the host is running (entry point or command);
 // "" when the host itself is running.

@@ -118,9 +118,7 @@ extern "C" __attribute__((visibility("default"))) AcRx::AppRetCode acrxEntryPoin
     case AcRx::kUnloadAppMsg:
         if (g_services != nullptr) {
             acedRegCmds()->removeGroup(kGroup);
-            auto* services = static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"));
-            if (services != nullptr && services->at(kVelConfigServicesName) == g_services)
-                services->remove(kVelConfigServicesName);
+            velUnregisterService(kVelConfigServicesName, g_services);
             delete g_services;
             g_services = nullptr;
         }

@@ -177,9 +177,7 @@ extern "C" __attribute__((visibility("default"))) AcRx::AppRetCode acrxEntryPoin
     case AcRx::kUnloadAppMsg:
         if (g_services != nullptr) {
             g_services->SetUnloading();
-            AcRxDictionary* services = static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"));
-            if (services != nullptr && services->at(kVelMainServicesName) == g_services)
-                services->remove(kVelMainServicesName);
+            velUnregisterService(kVelMainServicesName, g_services);
             delete g_services;
             g_services = nullptr;
         }

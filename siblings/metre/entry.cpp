@@ -1,5 +1,5 @@
 // Entry point of the metre module and its six exported functions.
-#include "metre_exports.h"
+#include "velsiblings/metre_services.h"
 #include "metre_services.hpp"
 #include "schedule_editor.hpp"
 
@@ -13,10 +13,7 @@ public:
     const char* className() const override { return "CVelMetreService"; }
 };
 
-AcRxDictionary* ServiceDictionary()
-{
-    return static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"));
-}
+CVelMetreService* g_service = nullptr;
 
 } // namespace
 
@@ -26,10 +23,15 @@ extern "C" __attribute__((visibility("default"))) AcRx::AppRetCode acrxEntryPoin
     case AcRx::kInitAppMsg:
         acrxDynamicLinker()->unlockApplication(appId);
         acrxDynamicLinker()->registerAppMDIAware(appId);
-        acrxDynamicLinker()->registerService(kMetreServiceName, new CVelMetreService());
+        if (g_service == nullptr) {
+            g_service = new CVelMetreService();
+            acrxDynamicLinker()->registerService(kVelMetreServicesName, g_service);
+        }
         break;
     case AcRx::kUnloadAppMsg:
-        delete ServiceDictionary()->remove(kMetreServiceName);
+        velUnregisterService(kVelMetreServicesName, g_service);
+        delete g_service;
+        g_service = nullptr;
         break;
     default:
         break;

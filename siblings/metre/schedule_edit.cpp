@@ -201,7 +201,7 @@ std::vector<ScheduleChange> ScheduleEdit::Changes() const
     const auto copy = [](const CZodEVIArticle& a) { return std::make_unique<CZodEVIArticle>(a); };
     for (const Entry& entry : entries_) {
         if (!entry.original) {
-            added.push_back({kChangeAdded, copy(entry.article)});
+            added.push_back({kEditAdded, copy(entry.article)});
             continue;
         }
         kept[*entry.original] = true;
@@ -209,16 +209,16 @@ std::vector<ScheduleChange> ScheduleEdit::Changes() const
         if (SameArticle(before, entry.article))
             continue;
         if (EqualsNoCase(before.treePath, entry.article.treePath)) {
-            modified.push_back({kChangeModified, copy(entry.article)});
+            modified.push_back({kEditModified, copy(entry.article)});
         } else {
-            deleted.push_back({kChangeDeleted, copy(before)});
-            added.push_back({kChangeAdded, copy(entry.article)});
+            deleted.push_back({kEditDeleted, copy(before)});
+            added.push_back({kEditAdded, copy(entry.article)});
         }
     }
     std::vector<ScheduleChange> changes;
     for (std::size_t i = 0; i < original_.size(); ++i)
         if (!kept[i])
-            changes.push_back({kChangeDeleted, copy(*original_[i])});
+            changes.push_back({kEditDeleted, copy(*original_[i])});
     for (auto* list : {&deleted, &modified, &added})
         for (ScheduleChange& change : *list)
             changes.push_back(std::move(change));

@@ -1,10 +1,11 @@
 // One editing session of the schedule: the articles as opened, the user's deletions,
 // field changes and additions, their validation, and the change list handed back to
-// the caller (kinds 1 deleted, 2 modified, 3 added). Also the text table that the
+// the caller (the contract's change kinds). Also the text table that the
 // terminal editor shows and reads back.
 #pragma once
 
 #include "schedule_file.hpp"
+#include "velsiblings/metre_services.h"
 
 #include <cstdint>
 #include <optional>
@@ -13,8 +14,6 @@
 #include <vector>
 
 namespace metre {
-
-enum : std::uint32_t { kChangeDeleted = 1, kChangeModified = 2, kChangeAdded = 3 };
 
 struct ScheduleChange {
     std::uint32_t kind = 0;

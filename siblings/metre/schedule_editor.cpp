@@ -78,7 +78,7 @@ ArticleVector Rebase(const ArticleVector& original, ArticleVector newer, std::ve
     };
     for (ScheduleChange& change : changes) {
         const auto there = find(change.article->treePath);
-        if (change.kind == kChangeDeleted) {
+        if (change.kind == kEditDeleted) {
             if (there != newer.end())
                 newer.erase(there);
             continue;
@@ -90,7 +90,7 @@ ArticleVector Rebase(const ArticleVector& original, ArticleVector newer, std::ve
             newer.push_back(std::make_unique<CZodEVIArticle>(*change.article));
             continue;
         }
-        if (change.kind == kChangeModified && before != original.end()) {
+        if (change.kind == kEditModified && before != original.end()) {
             for (const CZodEVIArticleField& field : ArticleFields())
                 if (FieldText(**before, field) != FieldText(*change.article, field))
                     SetFieldText(**there, field, FieldText(*change.article, field));

@@ -8,10 +8,9 @@
 #include "network_records.hpp"
 #include "velhost/documents.h"
 #include "velhost/rx.h"
+#include "velsiblings/network_services.h"
 
 namespace {
-
-constexpr const char* kServiceName = "VelantoReseDimServices r17.2";
 
 class CVelReseDimSrv final : public AcRxService {
  public:
@@ -22,21 +21,15 @@ CVelReseDimSrv* g_service = nullptr;
 
 void RemoveService()
 {
-    if (g_service == nullptr)
-        return;
-    AcRxDictionary* services = static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"));
-    if (services != nullptr && services->at(kServiceName) == g_service)
-        services->remove(kServiceName);
+    velUnregisterService(kVelNetworkServicesName, g_service);
     delete g_service;
     g_service = nullptr;
 }
 
 } // namespace
 
-#define RSX_EXPORT extern "C" __attribute__((visibility("default")))
-
 // 0 the records are written, 1 no drawing is open, 2 the drawing refused a change.
-RSX_EXPORT std::int32_t Rsx_WriteXDataMetres()
+std::int32_t Rsx_WriteXDataMetres()
 {
     AcDbDatabase* database = acdbHostApplicationServices()->workingDatabase();
     if (database == nullptr)
@@ -47,12 +40,12 @@ RSX_EXPORT std::int32_t Rsx_WriteXDataMetres()
 }
 
 // 0 the list holds the network's projects, 1 none (or no drawing), 2 a null argument.
-RSX_EXPORT std::int32_t Rsx_GetRsxFromType(std::string* networkName, std::vector<std::string>* projects)
+std::int32_t Rsx_GetRsxFromType(std::string* networkName, std::vector<std::string>* projects)
 {
     return network::ProjectsOfNetwork(acdbHostApplicationServices()->workingDatabase(), networkName, projects);
 }
 
-RSX_EXPORT AcRx::AppRetCode acrxEntryPoint(AcRx::AppMsgCode message, void* appId)
+extern "C" __attribute__((visibility("default"))) AcRx::AppRetCode acrxEntryPoint(AcRx::AppMsgCode message, void* appId)
 {
     switch (message) {
     case AcRx::kInitAppMsg:
@@ -60,7 +53,7 @@ RSX_EXPORT AcRx::AppRetCode acrxEntryPoint(AcRx::AppMsgCode message, void* appId
         acrxDynamicLinker()->registerAppMDIAware(appId);
         if (g_service == nullptr) {
             g_service = new CVelReseDimSrv();
-            acrxDynamicLinker()->registerService(kServiceName, g_service);
+            acrxDynamicLinker()->registerService(kVelNetworkServicesName, g_service);
         }
         if (!network::AddCommands()) {
             RemoveService();

@@ -9,6 +9,7 @@
 #include "velhost/documents.h"
 #include "velhost/editor.h"
 #include "velhost/rx.h"
+#include "velsiblings/module_search.h"
 #include "zodevi/api.h"
 
 namespace network {
@@ -45,20 +46,7 @@ void RecordsCommand()
 
 void* FindZodEVIFunction(const char* symbol)
 {
-    if (!acrxServiceIsRegistered(kZodEVIServiceName)) {
-        const std::string candidates[] = {
-            kZodEVIModuleFile,
-            FormatString("..\\Programmes\\%s", kZodEVIModuleFile),
-            FormatString("Programmes\\%s", kZodEVIModuleFile),
-        };
-        for (const std::string& candidate : candidates) {
-            std::string found;
-            if (acedFindFile(candidate.c_str(), found) == RTNORM) {
-                acrxLoadModule(found.c_str(), true, true);
-                break;
-            }
-        }
-    }
+    velLoadServiceModule(kZodEVIServiceName, VelModuleCandidates(kZodEVIModuleFile));
     return acrxGetServiceSymbolAddr(kZodEVIServiceName, symbol);
 }
 

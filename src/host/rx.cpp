@@ -283,6 +283,26 @@ bool AcRxDynamicLinker::loadModule(const char* fileName, bool printit, bool asCm
     acutPrintf("Impossible d'ouvrir le module %s : %s\n", path.c_str(), why ? why : "?");
     return false;
   }
+  // Nothing of a module built for another interface is called: its objects and
+  // messages would not mean what this host means by them.
+  const auto version = reinterpret_cast<AcRxGetApiVersionFn>(dlsym(module->handle, "acrxGetApiVersion"));
+  if (version == nullptr) {
+    acutPrintf("Le module %s n'exporte pas acrxGetApiVersion : on ne sait pas pour quelle version de l'interface "
+               "de l'hôte il est écrit ; il n'est pas chargé.\n",
+               path.c_str());
+    return false;
+  }
+  int release = 0;
+  {
+    VelAppScope scope(module);
+    release = version();
+  }
+  if (release != kAcRxApiVersion) {
+    acutPrintf("Le module %s est écrit pour la version %d de l'interface de l'hôte, et cet hôte est de la "
+               "version %d : il n'est pas chargé.\n",
+               path.c_str(), release, kAcRxApiVersion);
+    return false;
+  }
   module->entry = reinterpret_cast<AcRxEntryPointFn>(dlsym(module->handle, "acrxEntryPoint"));
   if (module->entry == nullptr) {
     acutPrintf("Le module %s n'exporte pas de point d'entrée acrxEntryPoint.\n", path.c_str());
@@ -398,6 +418,24 @@ bool acrxServiceIsRegistered(const char* serviceName) {
   return serviceName != nullptr && ServiceDictionary()->has(serviceName);
 }
 
+VelServiceModule velLoadServiceModule(const char* serviceName, const std::vector<std::string>& candidates) {
+  VelServiceModule result;
+  if (acrxServiceIsRegistered(serviceName)) {
+    result.status = VelServiceModule::kRegistered;
+    return result;
+  }
+  for (const std::string& candidate : candidates)
+    if (acedFindFile(candidate.c_str(), result.path) == RTNORM) break;
+  if (result.path.empty()) {
+    result.status = VelServiceModule::kNotFound;
+  } else if (!acrxLoadModule(result.path.c_str(), true, true)) {
+    result.status = VelServiceModule::kNotLoaded;
+  } else {
+    result.status = acrxServiceIsRegistered(serviceName) ? VelServiceModule::kLoaded : VelServiceModule::kNoService;
+  }
+  return result;
+}
+
 void* acrxGetServiceSymbolAddr(const char* serviceName, const char* symbolName) {
   if (serviceName == nullptr || symbolName == nullptr || *symbolName == '\0') return nullptr;
   auto it = State().services.find(std::string_view(serviceName));
@@ -423,6 +461,15 @@ void velRegisterInProcessService(const char* serviceName, AcRxService* service,
   owner.inProcess = true;
   owner.symbols = std::move(symbols);
   State().services[serviceName] = std::move(owner);
+}
+
+bool velUnregisterService(const char* serviceName, const AcRxService* service) {
+  if (serviceName == nullptr || service == nullptr || ServiceDictionary()->at(serviceName) != service) return false;
+  ServiceDictionary()->remove(serviceName);
+  auto& services = State().services;
+  const auto owner = services.find(std::string_view(serviceName));
+  if (owner != services.end() && owner->second.service == service) services.erase(owner);
+  return true;
 }
 
 const char* acedGetAppName() {

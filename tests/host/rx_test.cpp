@@ -42,12 +42,17 @@ TEST_F(DynamicLinker, LoadFailuresSayWhichStepFailed)
         {"absent_module.arx", "Impossible de trouver le module absent_module.arx."},
         {"entryless_module.arx", "n'exporte pas de point d'entrée acrxEntryPoint"},
         {"refusing_module.arx", "a refusé de démarrer (réponse 3)"},
+        {"old_release_module.arx", "old_release_module.arx est écrit pour la version 14 de l'interface de l'hôte, "
+                                   "et cet hôte est de la version 15 : il n'est pas chargé."},
+        {"versionless_module.arx", "versionless_module.arx n'exporte pas acrxGetApiVersion"},
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.name);
         session.ClearOutput();
         EXPECT_FALSE(acrxLoadModule(c.name, false));
         EXPECT_NE(session.Output().find(c.expected), std::string::npos) << session.Output();
+        // A module of another release is never started.
+        EXPECT_EQ(session.Output().find("entry point called"), std::string::npos);
     }
     EXPECT_TRUE(velLoadedModules().empty());
     // What the refusing module registered before refusing went with it.
@@ -142,6 +147,30 @@ TEST_F(DynamicLinker, AbortDuringStartUpLeavesNothingLoaded)
     EXPECT_TRUE(velLoadedModules().empty());
 }
 
+TEST_F(DynamicLinker, ServiceModuleLoadSaysHowItWent)
+{
+    struct Case {
+        const char* service;
+        std::vector<std::string> candidates;
+        VelServiceModule::Status status;
+        const char* path;
+    };
+    const Case cases[] = {
+        {"VelTestGoodService", {"absent_module.arx", "good_module.arx"}, VelServiceModule::kLoaded, "good_module.arx"},
+        // Now there: nothing is searched.
+        {"VelTestGoodService", {"absent_module.arx"}, VelServiceModule::kRegistered, nullptr},
+        {"VelTestOther", {"absent_module.arx"}, VelServiceModule::kNotFound, nullptr},
+        {"VelTestOther", {"refusing_module.arx"}, VelServiceModule::kNotLoaded, "refusing_module.arx"},
+        {"VelTestOther", {"sloppy_module.arx"}, VelServiceModule::kNoService, "sloppy_module.arx"},
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.candidates.back());
+        const VelServiceModule module = velLoadServiceModule(c.service, c.candidates);
+        EXPECT_EQ(module.status, c.status);
+        EXPECT_EQ(module.path, c.path ? ModulePath(c.path) : "");
+    }
+}
+
 TEST(ServiceDictionary, InProcessServiceAnswersItsTable)
 {
     static AcRxService service;
@@ -156,6 +185,33 @@ TEST(ServiceDictionary, InProcessServiceAnswersItsTable)
     EXPECT_EQ(dict->remove("VelTestInProcess"), &service);
     EXPECT_FALSE(acrxServiceIsRegistered("VelTestInProcess"));
     EXPECT_EQ(acrxGetServiceSymbolAddr("VelTestInProcess", "Marker"), nullptr);
+}
+
+TEST(ServiceDictionary, UnregisterTakesOnlyTheCallersService)
+{
+    static AcRxService mine, theirs;
+    velRegisterInProcessService("VelTestShared", &mine, {});
+    // Another filed its own service under the name since.
+    velRegisterInProcessService("VelTestShared", &theirs, {});
+    struct Case {
+        const char* what;
+        const char* name;
+        const AcRxService* service;
+        bool removed;
+        bool registeredAfter;
+    };
+    const Case cases[] = {
+        {"no longer mine", "VelTestShared", &mine, false, true},
+        {"no name", nullptr, &theirs, false, true},
+        {"no service", "VelTestShared", nullptr, false, true},
+        {"still theirs", "VelTestShared", &theirs, true, false},
+        {"already gone", "VelTestShared", &theirs, false, false},
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.what);
+        EXPECT_EQ(velUnregisterService(c.name, c.service), c.removed);
+        EXPECT_EQ(acrxServiceIsRegistered("VelTestShared"), c.registeredAfter);
+    }
 }
 
 TEST(Abort, HandlerReceivesTheFormattedMessage)

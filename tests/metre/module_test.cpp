@@ -5,7 +5,7 @@
 #include "support/temp_dir.hpp"
 #include "module/service_api.hpp"
 #include "module/siblings.hpp"
-#include "ui/config_page.hpp"
+#include "module/config_page.hpp"
 #include "velhost/documents.h"
 #include "velhost/profile.h"
 #include "velhost/rx.h"
@@ -20,9 +20,6 @@
 
 namespace {
 
-using VtMetre_AfficherAssocFn = std::int32_t(std::string name, std::vector<CZodEVIAssocLine*>* lines,
-                                             std::int32_t show, std::int32_t mode);
-
 class MetreModule : public ::testing::Test {
 protected:
     void SetUp() override
@@ -30,11 +27,13 @@ protected:
         saved = velHostSettings();
         velHostSettings().profileDir = dir.path.string();
         ASSERT_TRUE(acrxLoadModule(VEL_MODULE_DIR "/VelMetre15.arx", false));
-        ASSERT_TRUE(acrxServiceIsRegistered(kMetreService));
+        ASSERT_TRUE(acrxServiceIsRegistered(kVelMetreServicesName));
+        SetBdrMetre(&::MetreModule());
         bdr.path = dir.File("VelaBordereau.xml");
     }
     void TearDown() override
     {
+        SetBdrMetre(nullptr);
         acDocManager->closeAll();
         velUnloadAllModules();
         velHostSettings() = saved;

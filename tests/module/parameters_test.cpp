@@ -1,6 +1,6 @@
 // Parameters in INI files and the registry, the error message once per file, message
 // boxes and the Yes/No question.
-#include "module/parameters.hpp"
+#include "common/parameters.hpp"
 
 #include <gtest/gtest.h>
 

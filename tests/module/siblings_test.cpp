@@ -81,7 +81,7 @@ TEST_F(Siblings, RegisteredServiceNeedsNoFile)
     EXPECT_EQ(GetServiceSymbol(nullptr, "VelTestSibling", "Marqueur"), &marker);
     EXPECT_EQ(GetServiceObject("Absent.arx", "VelTestSibling"), &service);
     EXPECT_EQ(session.Output(), "");
-    static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"))->remove("VelTestSibling");
+    velUnregisterService("VelTestSibling", &service);
 }
 
 TEST_F(Siblings, MissingNamesAnswerNothingWithoutSearching)
@@ -166,16 +166,17 @@ TEST_F(Siblings, ForwardersAnswerOneWhenTheFunctionIsMissing)
     EXPECT_TRUE(names.empty());
 
     static AcRxService metre, network;
-    velRegisterInProcessService(kMetreService, &metre, {{"VtMetre_ListeDesMetres", reinterpret_cast<void*>(&FakeList)}});
-    velRegisterInProcessService(kNetworkService, &network, {{"Rsx_WriteXDataMetres", reinterpret_cast<void*>(&FakeWrite)}});
+    velRegisterInProcessService(kVelMetreServicesName, &metre,
+                                {{"VtMetre_ListeDesMetres", reinterpret_cast<void*>(&FakeList)}});
+    velRegisterInProcessService(kVelNetworkServicesName, &network,
+                                {{"Rsx_WriteXDataMetres", reinterpret_cast<void*>(&FakeWrite)}});
     EXPECT_EQ(sibling::VtMetre_ListeDesMetres(&names, &out), 0);
     EXPECT_EQ(names, std::vector<std::string>{"Devis"});
     EXPECT_EQ(out, 9);
     EXPECT_EQ(sibling::Rsx_WriteXDataMetres(), 5);
     EXPECT_EQ(sibling::VtMetre_SymbMonetaire(&text), 1);
-    auto* dict = static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"));
-    dict->remove(kMetreService);
-    dict->remove(kNetworkService);
+    velUnregisterService(kVelMetreServicesName, &metre);
+    velUnregisterService(kVelNetworkServicesName, &network);
 }
 
 } // namespace

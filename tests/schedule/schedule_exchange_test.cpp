@@ -1,9 +1,9 @@
-// The exchange with the metre module, against an in-process stand-in whose answers each
+// The exchange with the metre module, against a stand-in whose answers each
 // test sets: reading with the road articles, prices by selector, the editor's changes
 // and the file written after them, partial reads and a missing module.
 #include "schedule/schedule_exchange.hpp"
 
-#include "module/siblings.hpp"
+#include "schedule/metre_link.hpp"
 #include "text/text.hpp"
 #include "velhost/files.h"
 #include "velhost/rx.h"
@@ -21,8 +21,39 @@
 
 namespace {
 
-// What the stand-in metre module holds and answers.
-struct FakeMetre {
+// A metre module whose file and answers each test sets.
+struct FakeMetre final : CZodEVIBdrMetre {
+    std::int32_t FillTable(const std::string& path, std::vector<CZodEVIArticle*>& table) override
+    {
+        if (duringFill)
+            duringFill(path);
+        for (const CZodEVIArticle& article : file) {
+            table.push_back(new CZodEVIArticle(article));
+            if (failAfterPartialRead && table.size() == 2)
+                return 1;
+        }
+        return 0;
+    }
+    std::int32_t ExportTable(const std::string&, std::vector<CZodEVIArticle*>& table) override
+    {
+        ++writes;
+        file.clear();
+        for (const CZodEVIArticle* article : table)
+            file.push_back(*article);
+        return 0;
+    }
+    std::int32_t EditSchedule(const std::string&, const std::string& treePath, std::vector<CZodEVIArticle*>& records,
+                              std::vector<std::uint32_t>& actions) override
+    {
+        editorLabel = treePath;
+        for (const auto& [article, kind] : editorChanges) {
+            records.push_back(new CZodEVIArticle(article));
+            actions.push_back(kind);
+        }
+        return editorAnswer;
+    }
+    std::int32_t CurrencySymbol(std::string&) override { return 1; }
+
     std::vector<CZodEVIArticle> file;
     bool failAfterPartialRead = false;
     int writes = 0;
@@ -31,54 +62,16 @@ struct FakeMetre {
     std::string editorLabel;
     std::function<void(const std::string&)> duringFill; // what else happens while the file is read
 };
-FakeMetre* g_fake = nullptr;
-
-std::int32_t FakeFill(std::string path, std::vector<CZodEVIArticle*>* table, std::int32_t)
-{
-    if (g_fake->duringFill)
-        g_fake->duringFill(path);
-    for (const CZodEVIArticle& article : g_fake->file) {
-        table->push_back(new CZodEVIArticle(article));
-        if (g_fake->failAfterPartialRead && table->size() == 2)
-            return 1;
-    }
-    return 0;
-}
-
-std::int32_t FakeExport(std::string, std::vector<CZodEVIArticle*>* table, std::int32_t)
-{
-    ++g_fake->writes;
-    g_fake->file.clear();
-    for (const CZodEVIArticle* article : *table)
-        g_fake->file.push_back(*article);
-    return 0;
-}
-
-std::int32_t FakeEdit(std::string, std::vector<CZodEVIArticle*>* records, std::vector<std::uint32_t>* actions,
-                      std::string label)
-{
-    g_fake->editorLabel = label;
-    for (const auto& [article, kind] : g_fake->editorChanges) {
-        records->push_back(new CZodEVIArticle(article));
-        actions->push_back(kind);
-    }
-    return g_fake->editorAnswer;
-}
 
 class ScheduleExchange : public ::testing::Test {
 protected:
     void SetUp() override
     {
-        g_fake = &fake;
-        velRegisterInProcessService(kMetreService, new AcRxService(),
-                                    {{"VtMetre_RemplitTableau", reinterpret_cast<void*>(&FakeFill)},
-                                     {"VtMetre_ExporterXml", reinterpret_cast<void*>(&FakeExport)},
-                                     {"VtMetre_EditerBordereau", reinterpret_cast<void*>(&FakeEdit)}});
+        SetBdrMetre(&fake);
     }
     void TearDown() override
     {
-        delete static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"))->remove(kMetreService);
-        g_fake = nullptr;
+        SetBdrMetre(nullptr);
     }
     std::size_t GroupSize(const std::string& key)
     {
@@ -167,12 +160,11 @@ TEST_F(ScheduleExchange, FailedPartialReadLeavesStoreEmpty)
 
 TEST_F(ScheduleExchange, MissingMetreModuleFailsEveryCall)
 {
-    delete static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"))->remove(kMetreService);
+    SetBdrMetre(nullptr);
     EXPECT_FALSE(Read(bdr));
     EXPECT_TRUE(bdr.Articles().empty());
     EXPECT_FALSE(Write(bdr));
     EXPECT_FALSE(Edit(bdr, ""));
-    velRegisterInProcessService(kMetreService, new AcRxService(), {});
 }
 
 // The version a write compares the file with is the one the metre module read, whether

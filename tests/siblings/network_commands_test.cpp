@@ -83,8 +83,7 @@ protected:
     // No service and no drawing left behind.
     void Clean()
     {
-        auto* services = static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"));
-        services->remove(kZodEVIServiceName);
+        velUnregisterService(kZodEVIServiceName, &service);
         acDocManager->closeAll();
     }
     void OfferService(bool withWrite = true)

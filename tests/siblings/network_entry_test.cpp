@@ -10,14 +10,11 @@
 #include "velhost/commands.h"
 #include "velhost/documents.h"
 #include "velhost/rx.h"
+#include "velsiblings/network_services.h"
 
 namespace {
 
-constexpr const char* kService = "VelantoReseDimServices r17.2";
 constexpr const char* kModule = VEL_MODULE_DIR "/VelReseDimVRD15.arx";
-
-using WriteFn = std::int32_t();
-using ProjectsFn = std::int32_t(std::string*, std::vector<std::string>*);
 
 class NetworkModule : public ::testing::Test {
 protected:
@@ -30,7 +27,7 @@ protected:
     template <class Fn>
     Fn* Symbol(const char* name)
     {
-        return reinterpret_cast<Fn*>(acrxGetServiceSymbolAddr(kService, name));
+        return reinterpret_cast<Fn*>(acrxGetServiceSymbolAddr(kVelNetworkServicesName, name));
     }
 };
 
@@ -38,21 +35,21 @@ protected:
 
 TEST_F(NetworkModule, RegistersServiceAndCommandsUntilUnloaded)
 {
-    ASSERT_TRUE(acrxServiceIsRegistered(kService));
+    ASSERT_TRUE(acrxServiceIsRegistered(kVelNetworkServicesName));
     const AcEdCommand* command = acedRegCmds()->lookupCmd("VelaRsxMajBordereau");
     ASSERT_NE(command, nullptr);
     EXPECT_EQ(command->localName, "RsxMajBordereau");
     EXPECT_NE(acedRegCmds()->lookupCmd("RsxMetres"), nullptr);
     EXPECT_TRUE(acrxUnloadModule(kModule));
-    EXPECT_FALSE(acrxServiceIsRegistered(kService));
+    EXPECT_FALSE(acrxServiceIsRegistered(kVelNetworkServicesName));
     EXPECT_EQ(acedRegCmds()->lookupCmd("RsxMajBordereau"), nullptr);
     EXPECT_EQ(acedRegCmds()->lookupCmd("RsxMetres"), nullptr);
 }
 
 TEST_F(NetworkModule, ExportedFunctionsWorkOnTheCurrentDrawing)
 {
-    auto* write = Symbol<WriteFn>("Rsx_WriteXDataMetres");
-    auto* projects = Symbol<ProjectsFn>("Rsx_GetRsxFromType");
+    auto* write = Symbol<Rsx_WriteXDataMetresFn>("Rsx_WriteXDataMetres");
+    auto* projects = Symbol<Rsx_GetRsxFromTypeFn>("Rsx_GetRsxFromType");
     ASSERT_NE(write, nullptr);
     ASSERT_NE(projects, nullptr);
     std::string network = "EU";

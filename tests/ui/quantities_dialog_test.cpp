@@ -8,19 +8,23 @@
 #include "support/schedule.hpp"
 #include "support/session.hpp"
 #include "module/module_object.hpp"
-#include "module/siblings.hpp"
 #include "velhost/commands.h"
 #include "velhost/documents.h"
 
 namespace {
 
-std::int32_t FakeProjectsOfNetwork(std::string* network, std::vector<std::string>* projects)
+// The network sizing module standing in: the EU network's projects.
+CZodEVIDialogLinks Links()
 {
-    if (*network != "EU")
-        return 1;
-    // Unsorted, with a project the drawing does not hold.
-    *projects = {"EU 2", "Fantôme", "EU 1"};
-    return 0;
+    CZodEVIDialogLinks links;
+    links.projectsOfNetwork = [](std::string& network, std::vector<std::string>& projects) {
+        if (network != "EU")
+            return 1;
+        // Unsorted, with a project the drawing does not hold.
+        projects = {"EU 2", "Fantôme", "EU 1"};
+        return 0;
+    };
+    return links;
 }
 
 void FileRecord(AcDbDatabase& db, const char* first, const char* second, const std::string& name,
@@ -35,7 +39,7 @@ void FileRecord(AcDbDatabase& db, const char* first, const char* second, const s
 }
 
 // A drawing with two road projects and two EU projects, a schedule whose two road
-// articles "Bordure" land side by side, and sibling functions standing in.
+// articles "Bordure" land side by side, and the network sizing module standing in.
 class QuantitiesDialog : public ::testing::Test {
 protected:
     void SetUp() override
@@ -65,16 +69,10 @@ protected:
         FileRecord(*db, "VELANTO_RSX_VRD", "PROJECTS", "EU 1", {{"\"RSX_TUY\"", 20}});
         FileRecord(*db, "VELANTO_RSX_VRD", "PROJECTS", "EU 2", {{"\"RSX_TUY\"", 5}});
         document = acDocManagerPtr()->createDocument(std::move(db), "");
-        velRegisterInProcessService(kNetworkService, &network,
-                                    {{"Rsx_GetRsxFromType", reinterpret_cast<void*>(&FakeProjectsOfNetwork)}});
-        velRegisterInProcessService(kMetreService, &metre, {});
     }
 
     void TearDown() override
     {
-        auto* services = static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"));
-        services->remove(kNetworkService);
-        services->remove(kMetreService);
         acDocManagerPtr()->closeDocument(document);
     }
 
@@ -99,13 +97,12 @@ protected:
 
     CZodEVIBdr bdr;
     AcApDocument* document = nullptr;
-    AcRxService network, metre;
     std::string output;
 };
 
 TEST_F(QuantitiesDialog, ShowsTheProjectsAndTheirArticles)
 {
-    DlgMetExpArt dialog(nullptr, &bdr);
+    DlgMetExpArt dialog(nullptr, &bdr, Links());
     EXPECT_EQ(Run("afficher\nquitter\n", dialog), IDCANCEL);
     const std::string expected = "Projets\n"
                                  "[x] Projets routiers\n"
@@ -136,14 +133,14 @@ TEST_F(QuantitiesDialog, ShowsTheProjectsAndTheirArticles)
 TEST_F(QuantitiesDialog, EachLeafCarriesItsOwnArticle)
 {
     // Both "Bordure" leaves checked through their category: each brings its own line.
-    DlgMetExpArt dialog(nullptr, &bdr);
+    DlgMetExpArt dialog(nullptr, &bdr, Links());
     EXPECT_EQ(Run("article Voirie\\Bordures\nmode détail\nvalider\n", dialog), IDOK);
     EXPECT_EQ(Keys(dialog), (std::vector<std::string>{"\"BT2\" R1", "\"BTN\" R2"}));
 }
 
 TEST_F(QuantitiesDialog, ChecksFollowTheProjectsAcrossRebuilds)
 {
-    DlgMetExpArt dialog(nullptr, &bdr);
+    DlgMetExpArt dialog(nullptr, &bdr, Links());
     const std::string script = "article Voirie\\Terrassements\\Volumique\\Déblais\n"
                                "article EU\\Canalisation\\PVC 200\n"
                                // R1 off: Déblais stays (R2 has it), still checked.
@@ -169,7 +166,7 @@ TEST_F(QuantitiesDialog, ChecksFollowTheProjectsAcrossRebuilds)
 
 TEST_F(QuantitiesDialog, ClicksCountOnlyOnTheCheckBox)
 {
-    DlgMetExpArt dialog(nullptr, &bdr);
+    DlgMetExpArt dialog(nullptr, &bdr, Links());
     ScriptedSession session;
     ASSERT_TRUE(dialog.StartModal());
     SECTreeCtrl& tree = dialog.m_treeProjects;
@@ -210,7 +207,7 @@ TEST_F(QuantitiesDialog, ClicksCountOnlyOnTheCheckBox)
 
 TEST_F(QuantitiesDialog, ARebuildKeepsWhereThePersonStood)
 {
-    DlgMetExpArt dialog(nullptr, &bdr);
+    DlgMetExpArt dialog(nullptr, &bdr, Links());
     ScriptedSession session;
     ASSERT_TRUE(dialog.StartModal());
     SECTreeCtrl& articles = dialog.m_treeArticles;
@@ -263,7 +260,7 @@ CZodEVIBdr* g_bdr = nullptr;
 
 void RunDialogCommand()
 {
-    DlgMetExpArt dialog(nullptr, g_bdr);
+    DlgMetExpArt dialog(nullptr, g_bdr, Links());
     dialog.DoModal();
 }
 

@@ -35,7 +35,12 @@ void CreateEstimateCommand()
     int answer = IDCANCEL;
     {
         ResourceOverride resources;
-        dialog = std::make_unique<DlgMetExpArt>(MainServices()->GetParentWindow());
+        CZodEVIDialogLinks links;
+        links.resource = Resources().resource;
+        links.projectsOfNetwork = [](std::string& network, std::vector<std::string>& projects) {
+            return sibling::Rsx_GetRsxFromType(&network, &projects);
+        };
+        dialog = std::make_unique<DlgMetExpArt>(MainServices()->GetParentWindow(), CurrentBdr(), std::move(links));
         answer = dialog->DoModal();
     }
     if (answer != IDOK)

@@ -2,16 +2,18 @@
 // loaded (the schedule, the resources, the per-document records), the attach and detach
 // of the library, and the host's entry point.
 #include "module/module_object.hpp"
+#include "module/siblings.hpp"
 #include "schedule/schedule_store.hpp"
 
 namespace {
 
 // The schedule's constructor finds its default file through the main services; the
-// environment is in place before it.
+// environment is in place before it, and the metre module it exchanges with.
 struct CurrentSchedule {
     CurrentSchedule()
     {
         SetBdrEnvironment(&environment);
+        SetBdrMetre(&MetreModule());
         bdr = std::make_unique<CZodEVIBdr>();
         SetCurrentBdr(bdr.get());
     }
@@ -19,6 +21,7 @@ struct CurrentSchedule {
     {
         SetCurrentBdr(nullptr);
         bdr.reset();
+        SetBdrMetre(nullptr);
         SetBdrEnvironment(nullptr);
     }
     MainServicesEnvironment environment;
@@ -55,12 +58,6 @@ DocumentRecords g_documents;
 Library g_library;
 
 } // namespace
-
-// The host interface release the module is written for.
-extern "C" __attribute__((visibility("default"))) int acrxGetApiVersion()
-{
-    return 15;
-}
 
 extern "C" __attribute__((visibility("default"))) AcRx::AppRetCode acrxEntryPoint(AcRx::AppMsgCode message,
                                                                                   void* packet)

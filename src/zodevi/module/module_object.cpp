@@ -5,9 +5,9 @@
 #include <algorithm>
 #include <memory>
 
-#include "module/parameters.hpp"
+#include "common/parameters.hpp"
+#include "module/schedule_commands.hpp"
 #include "module/siblings.hpp"
-#include "schedule/commands.hpp"
 #include "schedule/schedule_exchange.hpp"
 #include "text/text.hpp"
 #include "velhost/commands.h"
@@ -77,12 +77,14 @@ CVelSrvModul::~CVelSrvModul()
 {
     // Normally gone with Unload; a module detached without it must not leave its service
     // filed under a deleted object.
-    if (service != nullptr) {
-        auto* services = static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"));
-        if (services != nullptr && services->at(kZodEVIServiceName) == service)
-            services->remove(kZodEVIServiceName);
-        delete service;
-    }
+    RemoveService();
+}
+
+void CVelSrvModul::RemoveService()
+{
+    velUnregisterService(kZodEVIServiceName, service);
+    delete service;
+    service = nullptr;
 }
 
 AcRx::AppRetCode CVelSrvModul::OnAppMessage(AcRx::AppMsgCode message, void* packet)
@@ -94,7 +96,8 @@ AcRx::AppRetCode CVelSrvModul::OnAppMessage(AcRx::AppMsgCode message, void* pack
         acrxDynamicLinker()->registerAppMDIAware(packet);
         if (Init() == 0)
             return AcRx::kRetError;
-        auto* config = static_cast<CVelConfigServices*>(GetServiceObject(kConfigModule, kConfigService));
+        auto* config =
+            static_cast<CVelConfigServices*>(GetServiceObject(kVelConfigServicesModule, kVelConfigServicesName));
         config->RegisterConfigPage("Métré", "Vel_ZodEVI_CfgUser", ModuleNameWithoutVersion(moduleName), "Métré");
         return AcRx::kRetOK;
     }
@@ -113,7 +116,7 @@ AcRx::AppRetCode CVelSrvModul::OnAppMessage(AcRx::AppMsgCode message, void* pack
 int CVelSrvModul::Init()
 {
     appPath = acedGetAppName();
-    if (!acrxServiceIsRegistered(kMainService)) {
+    if (!acrxServiceIsRegistered(kVelMainServicesName)) {
         const std::string text = FormatPattern(Message(505), {moduleName}) + Message(506) + "\n" + Message(507) +
                                  "\n" + Message(508);
         MessageBoxFlags(nullptr, MB_ICONERROR, "%s", text.c_str());
@@ -142,16 +145,10 @@ void CVelSrvModul::Unload()
 {
     acutPrintf("%s", FormatPattern(Message(503), {moduleName}).c_str());
     OnDrawingMessage();
-    if (acrxServiceIsRegistered(kMainService) && !MainServices()->UnloadQuery())
+    if (acrxServiceIsRegistered(kVelMainServicesName) && !MainServices()->UnloadQuery())
         MainServices()->UnregisterModule(moduleName);
     acedRegCmds()->removeGroup(kZodEVICommandGroup);
-    if (acrxServiceIsRegistered(kZodEVIServiceName)) {
-        auto* services = static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"));
-        if (services != nullptr)
-            services->remove(kZodEVIServiceName);
-        delete service;
-        service = nullptr;
-    }
+    RemoveService();
 }
 
 int CVelSrvModul::ListGroupCommands(const std::string& group, const char* lineFormat,

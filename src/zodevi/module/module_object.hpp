@@ -50,6 +50,11 @@ public:
     int ListGroupCommands(const std::string& group, const char* lineFormat, std::vector<std::string>* out) const;
 
     CVelZodEVISrv* service = nullptr;
+
+private:
+    // Takes the service out of the host, unless another module filed its own since, and
+    // destroys it.
+    void RemoveService();
 };
 
 // The one module object, while the library is attached.

@@ -3,7 +3,7 @@
 #include "module/siblings.hpp"
 
 #include "text/text.hpp"
-#include "velhost/editor.h"
+#include "velsiblings/module_search.h"
 
 namespace {
 
@@ -29,19 +29,9 @@ void* GetServiceSymbol(const char* moduleFile, const char* serviceName, const ch
     if (!acrxServiceIsRegistered(serviceName)) {
         if (moduleFile == nullptr || *moduleFile == '\0')
             return nullptr;
-        const char* extension = HasArxExtension(moduleFile) ? "" : ".arx";
-        const std::string candidates[] = {
-            FormatString("%s%s", moduleFile, extension),
-            FormatString("..\\Programmes\\%s%s", moduleFile, extension),
-            FormatString("Programmes\\%s%s", moduleFile, extension),
-        };
-        for (const std::string& candidate : candidates) {
-            std::string found;
-            if (acedFindFile(candidate.c_str(), found) == RTNORM) {
-                acrxLoadModule(found.c_str(), true, true);
-                break;
-            }
-        }
+        const std::string file = moduleFile + std::string(HasArxExtension(moduleFile) ? "" : ".arx");
+        // A module that does not come leaves the symbol unknown; the loader has said why.
+        velLoadServiceModule(serviceName, VelModuleCandidates(file));
     }
     return acrxGetServiceSymbolAddr(serviceName, symbolName);
 }
@@ -50,29 +40,23 @@ AcRxObject* GetServiceObject(const char* moduleFile, const char* serviceName)
 {
     const std::string file = moduleFile ? moduleFile : "";
     const std::string service = serviceName ? serviceName : "";
-    if (!acrxServiceIsRegistered(service.c_str())) {
-        const std::string candidates[] = {file, "..\\Programmes\\" + file, "Programmes\\" + file};
-        std::string found;
-        bool located = false;
-        for (const std::string& candidate : candidates) {
-            if (acedFindFile(candidate.c_str(), found) == RTNORM) {
-                located = true;
-                break;
-            }
-        }
-        if (!located)
-            acrx_abort("Impossible de trouver le module <%s>!!!", file.c_str());
-        if (!acrxDynamicLinker()->loadModule(found.c_str(), true, true))
-            acrx_abort("Impossible de charger le module <%s>!!!", found.c_str());
-        if (!acrxServiceIsRegistered(service.c_str()))
-            acrx_abort("Pas de service <%s>\nenregistré par le module <%s>!!!", service.c_str(), found.c_str());
+    const VelServiceModule module = velLoadServiceModule(service.c_str(), VelModuleCandidates(file));
+    switch (module.status) {
+    case VelServiceModule::kNotFound:
+        acrx_abort("Impossible de trouver le module <%s>!!!", file.c_str());
+    case VelServiceModule::kNotLoaded:
+        acrx_abort("Impossible de charger le module <%s>!!!", module.path.c_str());
+    case VelServiceModule::kNoService:
+        acrx_abort("Pas de service <%s>\nenregistré par le module <%s>!!!", service.c_str(), module.path.c_str());
+    default:
+        break;
     }
     return ServiceDictionary()->at(service.c_str());
 }
 
 CVelMainServices* MainServices()
 {
-    return static_cast<CVelMainServices*>(GetServiceObject(kMainModule, kMainService));
+    return static_cast<CVelMainServices*>(GetServiceObject(kVelMainServicesModule, kVelMainServicesName));
 }
 
 namespace sibling {
@@ -104,3 +88,31 @@ std::int32_t VtMetre_AfficherAssoc(const std::string& name, std::vector<CZodEVIA
 }
 
 } // namespace sibling
+
+namespace {
+
+class MetreServices final : public CZodEVIBdrMetre {
+public:
+    std::int32_t FillTable(const std::string& file, std::vector<CZodEVIArticle*>& table) override
+    {
+        return CallMetre<VtMetre_RemplitTableauFn>("VtMetre_RemplitTableau", file, &table, 1);
+    }
+    std::int32_t ExportTable(const std::string& file, std::vector<CZodEVIArticle*>& table) override
+    {
+        return CallMetre<VtMetre_ExporterXmlFn>("VtMetre_ExporterXml", file, &table, 1);
+    }
+    std::int32_t EditSchedule(const std::string& file, const std::string& treePath,
+                              std::vector<CZodEVIArticle*>& records, std::vector<std::uint32_t>& actions) override
+    {
+        return CallMetre<VtMetre_EditerBordereauFn>("VtMetre_EditerBordereau", file, &records, &actions, treePath);
+    }
+    std::int32_t CurrencySymbol(std::string& symbol) override { return sibling::VtMetre_SymbMonetaire(&symbol); }
+};
+
+} // namespace
+
+CZodEVIBdrMetre& MetreModule()
+{
+    static MetreServices metre;
+    return metre;
+}

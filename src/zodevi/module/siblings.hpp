@@ -8,19 +8,13 @@
 #include <utility>
 #include <vector>
 
+#include "schedule/metre_link.hpp"
 #include "velhost/rx.h"
+#include "velsiblings/config_services.h"
 #include "velsiblings/main_services.h"
+#include "velsiblings/metre_services.h"
+#include "velsiblings/network_services.h"
 #include "zodevi/assoc_line.h"
-
-// Module files and service names of the siblings.
-inline constexpr const char* kMetreModule = "VelMetre15.arx";
-inline constexpr const char* kMetreService = "VelantoMetreServices r17.2";
-inline constexpr const char* kNetworkModule = "VelReseDimVRD15.arx";
-inline constexpr const char* kNetworkService = "VelantoReseDimServices r17.2";
-inline constexpr const char* kMainModule = "Vel2000Srv.arx";
-inline constexpr const char* kMainService = "VelantoMainServices r17.2";
-inline constexpr const char* kConfigModule = "VelSrvConfig15.arx";
-inline constexpr const char* kConfigService = "VelantoConfigServices r17.2";
 
 // Address of the function the service exports under symbolName, loading the module file
 // first when the service is not registered; null when anything is missing. Silent.
@@ -33,14 +27,6 @@ AcRxObject* GetServiceObject(const char* moduleFile, const char* serviceName);
 
 // The main services module's service object (the host ends when the module is missing).
 CVelMainServices* MainServices();
-
-// Signatures of the sibling functions called with simple arguments.
-using Rsx_WriteXDataMetresFn = std::int32_t();
-using Rsx_GetRsxFromTypeFn = std::int32_t(std::string* networkName, std::vector<std::string>* projects);
-using VtMetre_ListeDesMetresFn = std::int32_t(std::vector<std::string>* names, std::int32_t* out);
-using VtMetre_SymbMonetaireFn = std::int32_t(std::string* symbol);
-using VtMetre_AfficherAssocFn = std::int32_t(std::string name, std::vector<CZodEVIAssocLine*>* lines, std::int32_t show,
-                                             std::int32_t mode);
 
 // Calls the function a sibling exports under symbol, as a function of type Fn; answers
 // 1 without calling when the function cannot be found, else the function's answer.
@@ -57,13 +43,14 @@ std::int32_t CallSiblingFunction(const char* moduleFile, const char* serviceName
 template <class Fn, class... Args>
 std::int32_t CallMetre(const char* symbol, Args&&... args)
 {
-    return CallSiblingFunction<Fn>(kMetreModule, kMetreService, symbol, std::forward<Args>(args)...);
+    return CallSiblingFunction<Fn>(kVelMetreServicesModule, kVelMetreServicesName, symbol, std::forward<Args>(args)...);
 }
 
 template <class Fn, class... Args>
 std::int32_t CallNetwork(const char* symbol, Args&&... args)
 {
-    return CallSiblingFunction<Fn>(kNetworkModule, kNetworkService, symbol, std::forward<Args>(args)...);
+    return CallSiblingFunction<Fn>(kVelNetworkServicesModule, kVelNetworkServicesName, symbol,
+                                   std::forward<Args>(args)...);
 }
 
 // Forwarders of the functions above (1 when missing). In a namespace of their own, so
@@ -76,3 +63,7 @@ std::int32_t VtMetre_SymbMonetaire(std::string* symbol);
 std::int32_t VtMetre_AfficherAssoc(const std::string& name, std::vector<CZodEVIAssocLine*>* lines, std::int32_t show,
                                    std::int32_t mode);
 } // namespace sibling
+
+// The metre module as the schedule takes it: its exported functions, reached through its
+// service (loading the module on demand), 1 when missing.
+CZodEVIBdrMetre& MetreModule();

@@ -2,8 +2,8 @@
 // queries by quantity selector.
 #include "schedule/schedule_exchange.hpp"
 
-#include "module/parameters.hpp"
-#include "module/siblings.hpp"
+#include "common/parameters.hpp"
+#include "schedule/metre_link.hpp"
 #include "text/text.hpp"
 #include "velhost/editor.h"
 #include "velhost/files.h"
@@ -97,8 +97,7 @@ bool ApplyChanges(CZodEVIBdr& bdr, const std::vector<CZodEVIArticle*>& records,
 std::int32_t CallEditor(const CZodEVIBdr& bdr, const std::string& treePath, ReturnedArticles& records,
                         std::vector<std::uint32_t>& actions)
 {
-    return CallMetre<VtMetre_EditerBordereauFn>("VtMetre_EditerBordereau", std::string(bdr.path), &records.list,
-                                                &actions, std::string(treePath));
+    return BdrMetre().EditSchedule(bdr.path, treePath, records.list, actions);
 }
 
 bool Export(CZodEVIBdr& bdr)
@@ -107,7 +106,7 @@ bool Export(CZodEVIBdr& bdr)
     list.reserve(bdr.Articles().size());
     for (const auto& article : bdr.Articles())
         list.push_back(article.get());
-    return CallMetre<VtMetre_ExporterXmlFn>("VtMetre_ExporterXml", std::string(bdr.path), &list, 1) == 0;
+    return BdrMetre().ExportTable(bdr.path, list) == 0;
 }
 
 bool SameFile(const std::string& a, const std::string& b)
@@ -158,8 +157,7 @@ bool ReadArticles(const std::string& path, ReturnedArticles& delivered, VelFileI
 {
     const std::uint64_t mark = velFileReadMark();
     const VelFileStamp stamp = velFileStamp(path);
-    const bool read =
-        CallMetre<VtMetre_RemplitTableauFn>("VtMetre_RemplitTableau", std::string(path), &delivered.list, 1) == 0;
+    const bool read = BdrMetre().FillTable(path, delivered.list) == 0;
     if (velFileReadSince(mark, path, before))
         return read;
     before = velFileIdentity(path);

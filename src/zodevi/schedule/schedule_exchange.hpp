@@ -4,21 +4,13 @@
 #pragma once
 
 #include "schedule/schedule_store.hpp"
+#include "velsiblings/metre_services.h"
 
 #include <cstdint>
 #include <functional>
 #include <map>
 #include <string>
 #include <vector>
-
-// Signatures of the metre module's schedule functions.
-using VtMetre_RemplitTableauFn = std::int32_t(std::string file, std::vector<CZodEVIArticle*>* table, std::int32_t flag);
-using VtMetre_ExporterXmlFn = std::int32_t(std::string file, std::vector<CZodEVIArticle*>* table, std::int32_t flag);
-using VtMetre_EditerBordereauFn = std::int32_t(std::string file, std::vector<CZodEVIArticle*>* records,
-                                               std::vector<std::uint32_t>* actions, std::string label);
-
-// Change kinds the editor returns.
-enum : std::uint32_t { kEditDeleted = 1, kEditModified = 2, kEditAdded = 3 };
 
 // The code pattern of a quantity selector (0 to 12); empty outside.
 std::string QuantityPatternOfSelector(int selector);

@@ -2,7 +2,7 @@
 // articles added by hand.
 #include "schedule/schedule_store.hpp"
 
-#include "generation/catalogue.hpp"
+#include "schedule/catalogue.hpp"
 #include "text/text.hpp"
 
 #include <algorithm>

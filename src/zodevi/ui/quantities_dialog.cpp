@@ -4,9 +4,7 @@
 
 #include <algorithm>
 
-#include "module/module_object.hpp"
-#include "module/service_api.hpp"
-#include "module/siblings.hpp"
+#include "schedule/metre_link.hpp"
 #include "text/text.hpp"
 #include "velhost/documents.h"
 #include "velhost/editor.h"
@@ -82,9 +80,8 @@ void CZodEVIGroupSelection::Clear()
     checkedNames.clear();
 }
 
-DlgMetExpArt::DlgMetExpArt(void* parent, CZodEVIBdr* schedule)
-    : CVelDialog(MetExpArtTemplate(), parent, Resources().resource),
-      m_bdr(schedule != nullptr ? schedule : CurrentBdr())
+DlgMetExpArt::DlgMetExpArt(void* parent, CZodEVIBdr* schedule, CZodEVIDialogLinks links)
+    : CVelDialog(MetExpArtTemplate(), parent, links.resource), m_bdr(schedule), m_links(std::move(links))
 {
     SetRootKey(&ProfileRootKey, CurrentProfile());
     SetDialogName(kDialogName);
@@ -136,7 +133,7 @@ bool DlgMetExpArt::OnInitDialog()
     m_treeArticles.StoreColumnText(true);
 
     std::string currency;
-    if (sibling::VtMetre_SymbMonetaire(&currency) == 0)
+    if (BdrMetre().CurrencySymbol(currency) == 0)
         m_strCurrency = currency;
 
     DiscoverProjects();
@@ -247,7 +244,7 @@ void DlgMetExpArt::FillProjectTree(int state)
     std::sort(networks.begin(), networks.end());
     for (std::string network : networks) {
         std::vector<std::string> projects;
-        if (sibling::Rsx_GetRsxFromType(&network, &projects) != 0)
+        if (!m_links.projectsOfNetwork || m_links.projectsOfNetwork(network, projects) != 0)
             continue;
         std::vector<std::string> kept;
         for (const std::string& project : projects)

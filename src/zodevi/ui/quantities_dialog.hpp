@@ -3,6 +3,8 @@
 // lines of the checked articles. It knows nothing of drawing: views show it.
 #pragma once
 
+#include <cstdint>
+#include <functional>
 #include <memory>
 #include <string>
 #include <unordered_map>
@@ -25,6 +27,14 @@ inline constexpr int IDC_RADIO_DETAIL = 2762;
 inline constexpr int IDC_GROUP_MODE = 2763;
 
 VelDialogTemplate MetExpArtTemplate();
+
+// What the dialog needs of the module around it: the resources its template comes from,
+// and the network sizing module's projects of a network (0 when it answers them). The
+// currency comes from the schedule's metre module.
+struct CZodEVIDialogLinks {
+    void* resource = nullptr;
+    std::function<std::int32_t(std::string& network, std::vector<std::string>& projects)> projectsOfNetwork;
+};
 
 // Check states, stored as an item's data and image alike.
 enum : int { kUnchecked = 0, kChecked = 1, kPartlyChecked = 2 };
@@ -52,8 +62,8 @@ private:
 
 class DlgMetExpArt : public CVelDialog {
 public:
-    // The dialog over a schedule (the current one by default).
-    explicit DlgMetExpArt(void* parent, CZodEVIBdr* schedule = nullptr);
+    // The dialog over a schedule; without one it shows nothing and closes.
+    DlgMetExpArt(void* parent, CZodEVIBdr* schedule, CZodEVIDialogLinks links = {});
     ~DlgMetExpArt() override;
 
     void DoDataExchange(CDataExchange* pDX) override;
@@ -126,6 +136,7 @@ private:
     HTREEITEM FindArticlePath(const std::vector<std::string>& texts) const;
 
     CZodEVIBdr* m_bdr;
+    CZodEVIDialogLinks m_links;
     // Built once per dialog: the schedule does not change while it is open.
     CZodEVIArticleKeyIndex m_roadKeys;
     std::vector<std::pair<std::string, CZodEVIArticleKeyIndex>> m_networkKeys;

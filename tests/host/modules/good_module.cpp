@@ -51,7 +51,8 @@ extern "C" __attribute__((visibility("default"))) AcRx::AppRetCode acrxEntryPoin
         break;
     case AcRx::kUnloadAppMsg:
         acedRegCmds()->removeGroup("VELTEST_GOOD");
-        delete static_cast<AcRxDictionary*>(acrxSysRegistry()->at("ServiceDictionary"))->remove("VelTestGoodService");
+        velUnregisterService("VelTestGoodService", g_service);
+        delete g_service;
         g_service = nullptr;
         acutPrintf("good: unload\n");
         break;

@@ -1,10 +1,10 @@
 // The configuration page of the price-schedule file, on the host's command line.
-#include "ui/config_page.hpp"
+#include "module/config_page.hpp"
 
 #include <filesystem>
 
+#include "common/parameters.hpp"
 #include "module/module_object.hpp"
-#include "module/parameters.hpp"
 #include "module/siblings.hpp"
 #include "schedule/schedule_exchange.hpp"
 #include "text/text.hpp"

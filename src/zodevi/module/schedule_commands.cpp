@@ -1,8 +1,8 @@
 // Display and purge commands of the price schedule.
-#include "schedule/commands.hpp"
+#include "module/schedule_commands.hpp"
 
+#include "common/parameters.hpp"
 #include "module/module_object.hpp"
-#include "module/parameters.hpp"
 #include "module/siblings.hpp"
 #include "schedule/schedule_exchange.hpp"
 #include "velhost/editor.h"

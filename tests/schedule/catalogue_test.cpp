@@ -1,6 +1,6 @@
 // The standard catalogue against the expected texts transcribed by hand in
 // tests/data/catalogue_expected.tsv: kinds, natures, codes, units and every network's texts.
-#include "generation/catalogue.hpp"
+#include "schedule/catalogue.hpp"
 #include "schedule/schedule_store.hpp"
 
 #include <fstream>

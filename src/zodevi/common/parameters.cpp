@@ -1,5 +1,5 @@
 // Parameter files (INI or registry), message boxes and the Yes/No question.
-#include "module/parameters.hpp"
+#include "common/parameters.hpp"
 
 #include <cerrno>
 #include <cstdarg>

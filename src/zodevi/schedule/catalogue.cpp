@@ -1,6 +1,6 @@
 // The 53 templates of the standard catalogue, as data: one row per template, with the
 // per-network category patterns, prefixes and texts in tables of their own.
-#include "generation/catalogue.hpp"
+#include "schedule/catalogue.hpp"
 
 #include "schedule/article.hpp"
 

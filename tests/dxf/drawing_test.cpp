@@ -13,7 +13,7 @@
 #include <sstream>
 
 #include "../host/file_faults.hpp"
-#include "../host/temp_dir.hpp"
+#include "support/temp_dir.hpp"
 #include "velhost/dbase.h"
 
 namespace {

@@ -6,7 +6,7 @@
 #include <memory>
 #include <stdexcept>
 
-#include "host_fixture.hpp"
+#include "support/session.hpp"
 
 namespace {
 

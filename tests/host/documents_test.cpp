@@ -8,7 +8,7 @@
 #include <string>
 #include <vector>
 
-#include "host_fixture.hpp"
+#include "support/session.hpp"
 
 namespace {
 

@@ -3,7 +3,7 @@
 
 #include <gtest/gtest.h>
 
-#include "host_fixture.hpp"
+#include "support/session.hpp"
 
 namespace {
 

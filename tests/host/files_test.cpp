@@ -14,7 +14,7 @@
 #include <string_view>
 
 #include "file_faults.hpp"
-#include "temp_dir.hpp"
+#include "support/temp_dir.hpp"
 
 namespace fs = std::filesystem;
 

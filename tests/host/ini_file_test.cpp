@@ -3,7 +3,7 @@
 
 #include <cerrno>
 
-#include "temp_dir.hpp"
+#include "support/temp_dir.hpp"
 #include "velhost/profile.h"
 
 namespace {

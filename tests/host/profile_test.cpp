@@ -4,7 +4,7 @@
 #include <gtest/gtest.h>
 
 
-#include "temp_dir.hpp"
+#include "support/temp_dir.hpp"
 #include "velhost/editor.h"
 
 namespace {

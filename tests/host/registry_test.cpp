@@ -1,7 +1,7 @@
 // The registry kept in the profile's file.
 #include <gtest/gtest.h>
 
-#include "temp_dir.hpp"
+#include "support/temp_dir.hpp"
 #include "velhost/profile.h"
 
 namespace {

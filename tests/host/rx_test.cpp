@@ -6,7 +6,7 @@
 #include <filesystem>
 #include <fstream>
 
-#include "host_fixture.hpp"
+#include "support/session.hpp"
 #include "velhost/commands.h"
 #include "velhost/documents.h"
 #include "velhost/profile.h"

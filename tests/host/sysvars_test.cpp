@@ -3,7 +3,7 @@
 
 #include <type_traits>
 
-#include "host_fixture.hpp"
+#include "support/session.hpp"
 #include "velhost/dbase.h"
 #include "velhost/documents.h"
 #include "velhost/editor.h"

@@ -10,7 +10,7 @@
 #include <cstdlib>
 #include <sstream>
 
-#include "host_fixture.hpp"
+#include "support/session.hpp"
 
 namespace {
 

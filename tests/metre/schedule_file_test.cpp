@@ -2,7 +2,7 @@
 // line and nothing delivered, and a write that fails leaves the file and its backup.
 #include "schedule_file.hpp"
 
-#include "../host/temp_dir.hpp"
+#include "support/temp_dir.hpp"
 #include "text/text.hpp"
 
 #include <gtest/gtest.h>

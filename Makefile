@@ -7,7 +7,7 @@ DEB_PACKAGES = cmake g++ clang lld make libgtest-dev libgmock-dev libbenchmark-d
                python3-ezdxf python3-openpyxl libdxflib-dev libclang-rt-14-dev libedit-dev \
                tmux nano
 
-.PHONY: deps build test fuzz demo bench clean
+.PHONY: deps build test fuzz demo bench format clean
 
 # Installs what is missing when run as root; otherwise only says what is missing.
 deps:
@@ -72,6 +72,10 @@ bench: deps
 	cmake -S . -B $(BENCH_BUILD) -DCMAKE_BUILD_TYPE=Release -DVEL_BENCH=ON
 	cmake --build $(BENCH_BUILD) -j$(JOBS)
 	@for b in $(BENCH_BUILD)/bin/bench_*; do [ -x "$$b" ] && "$$b"; done
+
+# One style for all the C++ sources (.clang-format; Debian package clang-format).
+format:
+	git ls-files '*.cpp' '*.hpp' '*.h' | xargs clang-format -i
 
 clean:
 	rm -rf $(BUILD)

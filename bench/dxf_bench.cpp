@@ -168,6 +168,6 @@ void BM_Cat(benchmark::State& state)
 }
 BENCHMARK(BM_Cat)->Unit(benchmark::kMillisecond)->Iterations(5)->UseRealTime();
 
-}  // namespace
+} // namespace
 
 BENCHMARK_MAIN();

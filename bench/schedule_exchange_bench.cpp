@@ -189,8 +189,8 @@ int main(int argc, char** argv)
     for (const char* n : {"1000", "10000", "100000"}) {
         ratios.push_back({std::string("Read / parse, ") + n + " articles", std::string("BM_Read/") + n,
                           std::string("BM_BareParse/") + n});
-        ratios.push_back({std::string("metre file read / parse, ") + n + " articles",
-                          std::string("BM_ReadFile/") + n, std::string("BM_BareParse/") + n});
+        ratios.push_back({std::string("metre file read / parse, ") + n + " articles", std::string("BM_ReadFile/") + n,
+                          std::string("BM_BareParse/") + n});
         ratios.push_back({std::string("Write / save, ") + n + " articles", std::string("BM_Write/") + n,
                           std::string("BM_BareSave/") + n});
     }

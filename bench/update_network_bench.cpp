@@ -122,11 +122,10 @@ BENCHMARK(BM_UpdateNetworkGroupSize)->Arg(200)->Arg(800)->Arg(3200)->Arg(12475)-
 
 int main(int argc, char** argv)
 {
-    return RunWithRatios(argc, argv,
-                         {{"repeat, group 1,650 / 450", "BM_UpdateNetworkGroupSize/800", "BM_UpdateNetworkGroupSize/200"},
-                          {"repeat, group 6,450 / 450", "BM_UpdateNetworkGroupSize/3200", "BM_UpdateNetworkGroupSize/200"},
-                          {"repeat, group 25,000 / 450", "BM_UpdateNetworkGroupSize/12475",
-                           "BM_UpdateNetworkGroupSize/200"},
-                          {"new network, 100,000 / 1,000 articles", "BM_UpdateNetworkNew/100000",
-                           "BM_UpdateNetworkNew/1000"}});
+    return RunWithRatios(
+        argc, argv,
+        {{"repeat, group 1,650 / 450", "BM_UpdateNetworkGroupSize/800", "BM_UpdateNetworkGroupSize/200"},
+         {"repeat, group 6,450 / 450", "BM_UpdateNetworkGroupSize/3200", "BM_UpdateNetworkGroupSize/200"},
+         {"repeat, group 25,000 / 450", "BM_UpdateNetworkGroupSize/12475", "BM_UpdateNetworkGroupSize/200"},
+         {"new network, 100,000 / 1,000 articles", "BM_UpdateNetworkNew/100000", "BM_UpdateNetworkNew/1000"}});
 }

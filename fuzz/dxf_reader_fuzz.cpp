@@ -34,7 +34,7 @@ void Walk(AcDbDatabase& db, AcDbObjectId id, int depth)
     std::abort();
 }
 
-}  // namespace
+} // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size)
 {

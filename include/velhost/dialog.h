@@ -38,33 +38,40 @@ constexpr int BN_CLICKED = 0;
 // control's client coordinates, x in its low word and y in its high word, each a signed
 // 16-bit value; for WM_KEYDOWN, wParam is the virtual key. `shift` is the Shift key.
 struct MSG {
-  unsigned message = 0;
-  int control = 0;
-  std::uintptr_t wParam = 0;
-  std::intptr_t lParam = 0;
-  bool shift = false;
+    unsigned message = 0;
+    int control = 0;
+    std::uintptr_t wParam = 0;
+    std::intptr_t lParam = 0;
+    bool shift = false;
 };
 
-constexpr std::intptr_t MAKELPARAM(int x, int y) {
-  return static_cast<std::intptr_t>(static_cast<std::uint32_t>(static_cast<std::uint16_t>(x)) |
-                                    (static_cast<std::uint32_t>(static_cast<std::uint16_t>(y)) << 16));
+constexpr std::intptr_t MAKELPARAM(int x, int y)
+{
+    return static_cast<std::intptr_t>(static_cast<std::uint32_t>(static_cast<std::uint16_t>(x)) |
+                                      (static_cast<std::uint32_t>(static_cast<std::uint16_t>(y)) << 16));
 }
-constexpr int GET_X_LPARAM(std::intptr_t lp) { return static_cast<std::int16_t>(lp & 0xFFFF); }
-constexpr int GET_Y_LPARAM(std::intptr_t lp) { return static_cast<std::int16_t>((lp >> 16) & 0xFFFF); }
+constexpr int GET_X_LPARAM(std::intptr_t lp)
+{
+    return static_cast<std::int16_t>(lp & 0xFFFF);
+}
+constexpr int GET_Y_LPARAM(std::intptr_t lp)
+{
+    return static_cast<std::int16_t>((lp >> 16) & 0xFFFF);
+}
 
 struct CPoint {
-  int x = 0;
-  int y = 0;
+    int x = 0;
+    int y = 0;
 };
 
 // Left, top, width, height: dialog units in a template, character cells in a tree's
 // client area (see SECTreeCtrl::SetMetrics).
 struct CRect {
-  int x = 0;
-  int y = 0;
-  int width = 0;
-  int height = 0;
-  bool Contains(CPoint p) const { return p.x >= x && p.x < x + width && p.y >= y && p.y < y + height; }
+    int x = 0;
+    int y = 0;
+    int width = 0;
+    int height = 0;
+    bool Contains(CPoint p) const { return p.x >= x && p.x < x + width && p.y >= y && p.y < y + height; }
 };
 
 // ---- the template ----
@@ -74,21 +81,21 @@ enum class VelControlKind { kTree, kGroupBox, kRadio, kButton };
 // One control of a template. `scriptName` is the word (or words) by which the script
 // line view names it ("projet", "mode somme", "valider"); empty for none.
 struct VelDialogControl {
-  int id = 0;
-  VelControlKind kind = VelControlKind::kButton;
-  std::string text;
-  CRect rect;
-  bool firstOfGroup = false;  // a radio button that starts its group
-  bool tabStop = false;
-  std::string scriptName;
+    int id = 0;
+    VelControlKind kind = VelControlKind::kButton;
+    std::string text;
+    CRect rect;
+    bool firstOfGroup = false; // a radio button that starts its group
+    bool tabStop = false;
+    std::string scriptName;
 };
 
 struct VelDialogTemplate {
-  std::string caption;
-  int width = 0;   // dialog units
-  int height = 0;
-  std::vector<VelDialogControl> controls;
-  const VelDialogControl* Find(int id) const;
+    std::string caption;
+    int width = 0; // dialog units
+    int height = 0;
+    std::vector<VelDialogControl> controls;
+    const VelDialogControl* Find(int id) const;
 };
 
 // ---- the check-tree control ----
@@ -124,122 +131,122 @@ class CDataExchange;
 // wide, then one cell, then its text (one cell per character); the indent cells just left
 // of the image of an item with children are its open/close button.
 class SECTreeCtrl {
- public:
-  SECTreeCtrl();
-  ~SECTreeCtrl();
-  SECTreeCtrl(const SECTreeCtrl&) = delete;
-  SECTreeCtrl& operator=(const SECTreeCtrl&) = delete;
+public:
+    SECTreeCtrl();
+    ~SECTreeCtrl();
+    SECTreeCtrl(const SECTreeCtrl&) = delete;
+    SECTreeCtrl& operator=(const SECTreeCtrl&) = delete;
 
-  // The dialog control it stands for (set by DDX_Control); 0 before.
-  int GetDlgCtrlID() const { return id_; }
+    // The dialog control it stands for (set by DDX_Control); 0 before.
+    int GetDlgCtrlID() const { return id_; }
 
-  // Columns: the first's heading and width, further ones inserted with a heading, an
-  // alignment (0 left, 1 right) and a width; widths are pixels of the original, which a
-  // view may scale. StoreColumnText keeps the texts set per item and column.
-  struct Column {
-    std::string heading;
-    int format = 0;
-    int width = 0;
-  };
-  void SetFirstColumnHeading(const std::string& heading);
-  void SetColumnWidth(int column, int width);
-  int InsertColumn(int column, const std::string& heading, int format, int width);
-  const std::vector<Column>& GetColumns() const { return columns_; }
-  void StoreColumnText(bool store) { storeColumnText_ = store; }
-  // The width the tree's client area had when the dialog opened, in pixels.
-  int GetClientWidth() const { return clientWidth_; }
-  void SetClientWidth(int width) { clientWidth_ = width; }
-  // Number of images of the normal image list (0 without one).
-  void SetImageCount(int count) { imageCount_ = count; }
-  int GetImageCount() const { return imageCount_; }
+    // Columns: the first's heading and width, further ones inserted with a heading, an
+    // alignment (0 left, 1 right) and a width; widths are pixels of the original, which a
+    // view may scale. StoreColumnText keeps the texts set per item and column.
+    struct Column {
+        std::string heading;
+        int format = 0;
+        int width = 0;
+    };
+    void SetFirstColumnHeading(const std::string& heading);
+    void SetColumnWidth(int column, int width);
+    int InsertColumn(int column, const std::string& heading, int format, int width);
+    const std::vector<Column>& GetColumns() const { return columns_; }
+    void StoreColumnText(bool store) { storeColumnText_ = store; }
+    // The width the tree's client area had when the dialog opened, in pixels.
+    int GetClientWidth() const { return clientWidth_; }
+    void SetClientWidth(int width) { clientWidth_ = width; }
+    // Number of images of the normal image list (0 without one).
+    void SetImageCount(int count) { imageCount_ = count; }
+    int GetImageCount() const { return imageCount_; }
 
-  // Items. Insertion is after the parent's last child (TVI_ROOT for the root level).
-  HTREEITEM InsertItem(const std::string& text, HTREEITEM parent = TVI_ROOT);
-  bool DeleteAllItems();
-  std::size_t GetCount() const { return count_; }
-  std::string GetItemText(HTREEITEM item) const;
-  // Column 0 is the item's text; others need StoreColumnText(true).
-  bool SetItemText(HTREEITEM item, int column, const std::string& text);
-  std::string GetItemText(HTREEITEM item, int column) const;
-  bool SetItemImage(HTREEITEM item, int image, int selectedImage);
-  bool GetItemImage(HTREEITEM item, int& image, int& selectedImage) const;
-  bool SetItemData(HTREEITEM item, std::uint32_t data);
-  std::uint32_t GetItemData(HTREEITEM item) const;
+    // Items. Insertion is after the parent's last child (TVI_ROOT for the root level).
+    HTREEITEM InsertItem(const std::string& text, HTREEITEM parent = TVI_ROOT);
+    bool DeleteAllItems();
+    std::size_t GetCount() const { return count_; }
+    std::string GetItemText(HTREEITEM item) const;
+    // Column 0 is the item's text; others need StoreColumnText(true).
+    bool SetItemText(HTREEITEM item, int column, const std::string& text);
+    std::string GetItemText(HTREEITEM item, int column) const;
+    bool SetItemImage(HTREEITEM item, int image, int selectedImage);
+    bool GetItemImage(HTREEITEM item, int& image, int& selectedImage) const;
+    bool SetItemData(HTREEITEM item, std::uint32_t data);
+    std::uint32_t GetItemData(HTREEITEM item) const;
 
-  HTREEITEM GetRootItem() const;
-  HTREEITEM GetChildItem(HTREEITEM item) const;
-  HTREEITEM GetNextSiblingItem(HTREEITEM item) const;
-  HTREEITEM GetPrevSiblingItem(HTREEITEM item) const;
-  HTREEITEM GetParentItem(HTREEITEM item) const;
-  bool ItemHasChildren(HTREEITEM item) const;
-  // Depth of an item, 0 at the root level.
-  int GetItemLevel(HTREEITEM item) const;
+    HTREEITEM GetRootItem() const;
+    HTREEITEM GetChildItem(HTREEITEM item) const;
+    HTREEITEM GetNextSiblingItem(HTREEITEM item) const;
+    HTREEITEM GetPrevSiblingItem(HTREEITEM item) const;
+    HTREEITEM GetParentItem(HTREEITEM item) const;
+    bool ItemHasChildren(HTREEITEM item) const;
+    // Depth of an item, 0 at the root level.
+    int GetItemLevel(HTREEITEM item) const;
 
-  bool Expand(HTREEITEM item, unsigned code);
-  bool IsExpanded(HTREEITEM item) const;
-  // Sorts the children of the item (the root level for TVI_ROOT), and theirs, in
-  // ascending order of text without regard to case; equal texts keep their order.
-  bool SortChildren(HTREEITEM item);
+    bool Expand(HTREEITEM item, unsigned code);
+    bool IsExpanded(HTREEITEM item) const;
+    // Sorts the children of the item (the root level for TVI_ROOT), and theirs, in
+    // ascending order of text without regard to case; equal texts keep their order.
+    bool SortChildren(HTREEITEM item);
 
-  // Selection and scrolling. EnsureVisible expands the ancestors and scrolls the item
-  // into the rows a view shows.
-  bool SelectItem(HTREEITEM item);
-  HTREEITEM GetSelectedItem() const { return selected_; }
-  bool EnsureVisible(HTREEITEM item);
+    // Selection and scrolling. EnsureVisible expands the ancestors and scrolls the item
+    // into the rows a view shows.
+    bool SelectItem(HTREEITEM item);
+    HTREEITEM GetSelectedItem() const { return selected_; }
+    bool EnsureVisible(HTREEITEM item);
 
-  // Geometry (see the class comment). A view sets its metrics and the number of rows it
-  // shows (0: all); scrolling moves the first visible row.
-  struct Metrics {
-    int rowHeight = 1;
-    int indent = 4;
-    int imageWidth = 3;
-    int origin = 0;  // room before a root item's image (for its button)
-  };
-  void SetMetrics(const Metrics& metrics) { metrics_ = metrics; }
-  const Metrics& GetMetrics() const { return metrics_; }
-  void SetVisibleCount(int rows);
-  int GetVisibleCount() const { return visibleRows_; }
-  int GetScrollPos() const { return topRow_; }
-  void SetScrollPos(int row);
-  // The shown rows, from the first visible one (all of them with `all`).
-  std::vector<HTREEITEM> GetVisibleItems(bool all = false) const;
-  // The item at a client point, with TVHT_* flags; null (TVHT_NOWHERE) below the rows.
-  HTREEITEM HitTest(CPoint point, unsigned* flags) const;
-  // Where a part of a shown item lies, in client coordinates (the row: from the left
-  // edge to the end of the text); false when not shown.
-  bool GetItemRect(HTREEITEM item, CRect& rect, VelTreePart part) const;
+    // Geometry (see the class comment). A view sets its metrics and the number of rows it
+    // shows (0: all); scrolling moves the first visible row.
+    struct Metrics {
+        int rowHeight = 1;
+        int indent = 4;
+        int imageWidth = 3;
+        int origin = 0; // room before a root item's image (for its button)
+    };
+    void SetMetrics(const Metrics& metrics) { metrics_ = metrics; }
+    const Metrics& GetMetrics() const { return metrics_; }
+    void SetVisibleCount(int rows);
+    int GetVisibleCount() const { return visibleRows_; }
+    int GetScrollPos() const { return topRow_; }
+    void SetScrollPos(int row);
+    // The shown rows, from the first visible one (all of them with `all`).
+    std::vector<HTREEITEM> GetVisibleItems(bool all = false) const;
+    // The item at a client point, with TVHT_* flags; null (TVHT_NOWHERE) below the rows.
+    HTREEITEM HitTest(CPoint point, unsigned* flags) const;
+    // Where a part of a shown item lies, in client coordinates (the row: from the left
+    // edge to the end of the text); false when not shown.
+    bool GetItemRect(HTREEITEM item, CRect& rect, VelTreePart part) const;
 
- private:
-  friend class CVelDialog;
-  friend void DDX_Control(CDataExchange*, int, SECTreeCtrl&);
-  void VisibleRows(std::vector<HTREEITEM>& rows) const;
-  int RowOf(HTREEITEM item) const;
+private:
+    friend class CVelDialog;
+    friend void DDX_Control(CDataExchange*, int, SECTreeCtrl&);
+    void VisibleRows(std::vector<HTREEITEM>& rows) const;
+    int RowOf(HTREEITEM item) const;
 
-  int id_ = 0;
-  std::vector<Column> columns_;
-  bool storeColumnText_ = false;
-  int clientWidth_ = 0;
-  int imageCount_ = 0;
-  // Items live in blocks kept across DeleteAllItems: a rebuild reuses their memory.
-  static constexpr std::size_t kBlock = 256;
-  std::vector<std::unique_ptr<VelTreeItem[]>> blocks_;
-  std::vector<VelTreeItem*> roots_;
-  std::size_t count_ = 0;
-  HTREEITEM selected_ = nullptr;
-  Metrics metrics_;
-  int visibleRows_ = 0;
-  int topRow_ = 0;
+    int id_ = 0;
+    std::vector<Column> columns_;
+    bool storeColumnText_ = false;
+    int clientWidth_ = 0;
+    int imageCount_ = 0;
+    // Items live in blocks kept across DeleteAllItems: a rebuild reuses their memory.
+    static constexpr std::size_t kBlock = 256;
+    std::vector<std::unique_ptr<VelTreeItem[]>> blocks_;
+    std::vector<VelTreeItem*> roots_;
+    std::size_t count_ = 0;
+    HTREEITEM selected_ = nullptr;
+    Metrics metrics_;
+    int visibleRows_ = 0;
+    int topRow_ = 0;
 };
 
 // ---- data exchange ----
 
 // Direction of one exchange: controls -> members when saving.
 class CDataExchange {
- public:
-  CDataExchange(CVelDialog& dialog, bool saveAndValidate) : m_pDlgWnd(&dialog), m_bSaveAndValidate(saveAndValidate) {}
-  CVelDialog* m_pDlgWnd;
-  bool m_bSaveAndValidate;
-  bool m_bFailed = false;
+public:
+    CDataExchange(CVelDialog& dialog, bool saveAndValidate) : m_pDlgWnd(&dialog), m_bSaveAndValidate(saveAndValidate) {}
+    CVelDialog* m_pDlgWnd;
+    bool m_bSaveAndValidate;
+    bool m_bFailed = false;
 };
 
 // Binds a tree member to the template's tree control of that id; a missing control
@@ -253,24 +260,24 @@ void DDX_Radio(CDataExchange* pDX, int firstId, int& value);
 
 // Moves and stretches controls by percentages of the change of the dialog's size.
 class CVelResizeInfoArray {
- public:
-  // Records the dialog's size and the controls' rectangles as the origin of later moves.
-  void init(CVelDialog* dialog);
-  void addCtrl(int id, int moveX, int moveY, int growX, int growY);
-  // The rectangles of the registered controls for a new dialog size.
-  void Apply(int width, int height);
-  bool Empty() const { return rules_.empty(); }
+public:
+    // Records the dialog's size and the controls' rectangles as the origin of later moves.
+    void init(CVelDialog* dialog);
+    void addCtrl(int id, int moveX, int moveY, int growX, int growY);
+    // The rectangles of the registered controls for a new dialog size.
+    void Apply(int width, int height);
+    bool Empty() const { return rules_.empty(); }
 
- private:
-  struct Rule {
-    int id;
-    int moveX, moveY, growX, growY;
-    CRect origin;
-  };
-  CVelDialog* dialog_ = nullptr;
-  int width_ = 0;
-  int height_ = 0;
-  std::vector<Rule> rules_;
+private:
+    struct Rule {
+        int id;
+        int moveX, moveY, growX, growY;
+        CRect origin;
+    };
+    CVelDialog* dialog_ = nullptr;
+    int width_ = 0;
+    int height_ = 0;
+    std::vector<Rule> rules_;
 };
 
 // ---- the dialog base ----
@@ -313,114 +320,114 @@ std::string velProfileRegistryKey(const std::string& profile);
 //     - the window's close box, end of input, ^C: Close() (WM_CLOSE, as "Quitter").
 //  4. Stops when IsEnded(); GetResult() is IDOK or IDCANCEL.
 class CVelDialog {
- public:
-  CVelDialog(VelDialogTemplate dialogTemplate, void* parent, void* resourceInstance);
-  virtual ~CVelDialog();
-  CVelDialog(const CVelDialog&) = delete;
-  CVelDialog& operator=(const CVelDialog&) = delete;
+public:
+    CVelDialog(VelDialogTemplate dialogTemplate, void* parent, void* resourceInstance);
+    virtual ~CVelDialog();
+    CVelDialog(const CVelDialog&) = delete;
+    CVelDialog& operator=(const CVelDialog&) = delete;
 
-  // Runs the dialog through the host's user interface; IDOK or IDCANCEL.
-  int DoModal();
+    // Runs the dialog through the host's user interface; IDOK or IDCANCEL.
+    int DoModal();
 
-  // ---- for views ----
-  bool StartModal();
-  bool IsEnded() const { return ended_; }
-  int GetResult() const { return result_; }
-  const VelDialogTemplate& GetTemplate() const { return template_; }
-  SECTreeCtrl* GetTree(int id) const;
-  bool IsDlgButtonChecked(int id) const;
-  int GetFocusId() const { return focus_; }
-  bool SetFocusId(int id);
-  // The control's rectangle after the resize rules (dialog units).
-  CRect GetControlRect(int id) const;
-  int GetWidth() const { return width_; }
-  int GetHeight() const { return height_; }
-  void Resize(int width, int height);
-  // The title a view shows above a tree: the template's text unless overridden.
-  virtual std::string TreeCaption(int treeId) const;
-  void Click(int id, CPoint point);
-  void KeyDown(unsigned virtualKey, bool shift = false);
-  void Close();
+    // ---- for views ----
+    bool StartModal();
+    bool IsEnded() const { return ended_; }
+    int GetResult() const { return result_; }
+    const VelDialogTemplate& GetTemplate() const { return template_; }
+    SECTreeCtrl* GetTree(int id) const;
+    bool IsDlgButtonChecked(int id) const;
+    int GetFocusId() const { return focus_; }
+    bool SetFocusId(int id);
+    // The control's rectangle after the resize rules (dialog units).
+    CRect GetControlRect(int id) const;
+    int GetWidth() const { return width_; }
+    int GetHeight() const { return height_; }
+    void Resize(int width, int height);
+    // The title a view shows above a tree: the template's text unless overridden.
+    virtual std::string TreeCaption(int treeId) const;
+    void Click(int id, CPoint point);
+    void KeyDown(unsigned virtualKey, bool shift = false);
+    void Close();
 
-  // ---- for the derived dialog ----
-  virtual void DoDataExchange(CDataExchange* pDX);
-  // True when the message was handled and goes no further.
-  virtual bool PreTranslateMessage(MSG* pMsg);
-  virtual bool OnInitDialog();
-  virtual void OnOK();
-  virtual void OnCancel();
-  // Exchange between controls and members; false when it failed.
-  virtual bool UpdateData(bool saveAndValidate = true);
-  void EndDialog(int result);
-  // Queues a message handled once the current call returns (WM_CLOSE only).
-  void PostMessage(unsigned message);
-  void CheckRadioButton(int firstId, int lastId, int checkedId);
-  void EnableToolTips(bool enable) { toolTips_ = enable; }
+    // ---- for the derived dialog ----
+    virtual void DoDataExchange(CDataExchange* pDX);
+    // True when the message was handled and goes no further.
+    virtual bool PreTranslateMessage(MSG* pMsg);
+    virtual bool OnInitDialog();
+    virtual void OnOK();
+    virtual void OnCancel();
+    // Exchange between controls and members; false when it failed.
+    virtual bool UpdateData(bool saveAndValidate = true);
+    void EndDialog(int result);
+    // Queues a message handled once the current call returns (WM_CLOSE only).
+    void PostMessage(unsigned message);
+    void CheckRadioButton(int firstId, int lastId, int checkedId);
+    void EnableToolTips(bool enable) { toolTips_ = enable; }
 
-  // Placement settings. A terminal dialog has no window placement to keep; what a
-  // person wants found again is the choice made in each radio group. With persistence
-  // on, a dialog ended by IDOK keeps that choice under the root key (ProfileKey), and
-  // ReadPosition clicks the button kept there, as the person would (false when none is
-  // kept). A scripted run neither reads nor writes it: a script says what it wants.
-  void SetRootKey(VelRootKeyCallback callback, const std::string& profile);
-  std::string ProfileKey() const;
-  void SetDialogName(const std::string& name) { dialogName_ = name; }
-  const std::string& GetDialogName() const { return dialogName_; }
-  void SetPersistency(bool persist) { persist_ = persist; }
-  bool GetPersistency() const { return persist_; }
-  void SetResizeBitmap(bool show) { resizeBitmap_ = show; }
-  bool GetResizeBitmap() const { return resizeBitmap_; }
-  bool ReadPosition();
+    // Placement settings. A terminal dialog has no window placement to keep; what a
+    // person wants found again is the choice made in each radio group. With persistence
+    // on, a dialog ended by IDOK keeps that choice under the root key (ProfileKey), and
+    // ReadPosition clicks the button kept there, as the person would (false when none is
+    // kept). A scripted run neither reads nor writes it: a script says what it wants.
+    void SetRootKey(VelRootKeyCallback callback, const std::string& profile);
+    std::string ProfileKey() const;
+    void SetDialogName(const std::string& name) { dialogName_ = name; }
+    const std::string& GetDialogName() const { return dialogName_; }
+    void SetPersistency(bool persist) { persist_ = persist; }
+    bool GetPersistency() const { return persist_; }
+    void SetResizeBitmap(bool show) { resizeBitmap_ = show; }
+    bool GetResizeBitmap() const { return resizeBitmap_; }
+    bool ReadPosition();
 
-  void* GetParent() const { return parent_; }
-  void* GetResourceInstance() const { return resourceInstance_; }
+    void* GetParent() const { return parent_; }
+    void* GetResourceInstance() const { return resourceInstance_; }
 
- protected:
-  using NotifyHandler = std::function<void(long* result)>;
-  using CommandHandler = std::function<void()>;
-  // The message map: a notification or command from a control to its handler.
-  void OnNotifyMessage(int id, int code, NotifyHandler handler);
-  void OnCommandMessage(int id, int code, CommandHandler handler);
+protected:
+    using NotifyHandler = std::function<void(long* result)>;
+    using CommandHandler = std::function<void()>;
+    // The message map: a notification or command from a control to its handler.
+    void OnNotifyMessage(int id, int code, NotifyHandler handler);
+    void OnCommandMessage(int id, int code, CommandHandler handler);
 
-  CVelResizeInfoArray m_resizeInfo;
+    CVelResizeInfoArray m_resizeInfo;
 
- private:
-  friend void DDX_Control(CDataExchange*, int, SECTreeCtrl&);
-  friend class CVelResizeInfoArray;
-  void Notify(int id, int code);
-  void Command(int id, int code);
-  void WritePosition();
-  void RunPosted();
-  void MoveFocus(bool backwards);
-  std::vector<int> FocusOrder() const;
+private:
+    friend void DDX_Control(CDataExchange*, int, SECTreeCtrl&);
+    friend class CVelResizeInfoArray;
+    void Notify(int id, int code);
+    void Command(int id, int code);
+    void WritePosition();
+    void RunPosted();
+    void MoveFocus(bool backwards);
+    std::vector<int> FocusOrder() const;
 
-  VelDialogTemplate template_;
-  void* parent_;
-  void* resourceInstance_;
-  std::vector<CRect> rects_;  // current rectangles, in template order
-  int width_ = 0;
-  int height_ = 0;
-  std::vector<std::pair<int, SECTreeCtrl*>> trees_;
-  std::vector<int> checkedRadios_;
-  struct Handler {
-    int id;
-    int code;
-    bool notify;
-    NotifyHandler onNotify;
-    CommandHandler onCommand;
-  };
-  std::vector<Handler> handlers_;
-  std::vector<unsigned> posted_;
-  int focus_ = 0;
-  bool started_ = false;
-  bool ended_ = false;
-  int result_ = 0;
-  bool toolTips_ = true;
-  VelRootKeyCallback rootKey_ = nullptr;
-  std::string profile_;
-  std::string dialogName_;
-  bool persist_ = false;
-  bool resizeBitmap_ = false;
+    VelDialogTemplate template_;
+    void* parent_;
+    void* resourceInstance_;
+    std::vector<CRect> rects_; // current rectangles, in template order
+    int width_ = 0;
+    int height_ = 0;
+    std::vector<std::pair<int, SECTreeCtrl*>> trees_;
+    std::vector<int> checkedRadios_;
+    struct Handler {
+        int id;
+        int code;
+        bool notify;
+        NotifyHandler onNotify;
+        CommandHandler onCommand;
+    };
+    std::vector<Handler> handlers_;
+    std::vector<unsigned> posted_;
+    int focus_ = 0;
+    bool started_ = false;
+    bool ended_ = false;
+    int result_ = 0;
+    bool toolTips_ = true;
+    VelRootKeyCallback rootKey_ = nullptr;
+    std::string profile_;
+    std::string dialogName_;
+    bool persist_ = false;
+    bool resizeBitmap_ = false;
 };
 
 // ---- views ----

@@ -10,7 +10,7 @@
 #pragma GCC visibility push(default)
 
 // Flags of acedInitGet.
-constexpr int RSG_NONULL = 0x0001;  // an empty answer is refused
+constexpr int RSG_NONULL = 0x0001; // an empty answer is refused
 
 // Prints on the command line (a printf format; pass data as an argument, never as the
 // format). Answers the number of bytes printed.

@@ -13,28 +13,28 @@
 
 // One group code and its value, decoded to UTF-8.
 struct VelDxfValue {
-  int code = 0;
-  std::string text;
+    int code = 0;
+    std::string text;
 };
 
 // A copy of one entity, taken when the drawing was walked; changing it changes nothing.
 struct VelEntity {
-  std::string dxfName;  // "LINE", "LWPOLYLINE", "INSERT", ...
-  AcDbObjectId id;
-  AcDbHandle handle = 0;
-  std::string layer;        // group 8; "0" when the file leaves it out
-  bool paperSpace = false;  // group 67 set to 1
-  // Every tag of the entity after its 0 tag, in file order, XData excluded.
-  std::vector<VelDxfValue> values;
-  // The VERTEX records of a POLYLINE, the ATTRIB records of an INSERT, each as its values.
-  std::vector<std::vector<VelDxfValue>> children;
+    std::string dxfName; // "LINE", "LWPOLYLINE", "INSERT", ...
+    AcDbObjectId id;
+    AcDbHandle handle = 0;
+    std::string layer;       // group 8; "0" when the file leaves it out
+    bool paperSpace = false; // group 67 set to 1
+    // Every tag of the entity after its 0 tag, in file order, XData excluded.
+    std::vector<VelDxfValue> values;
+    // The VERTEX records of a POLYLINE, the ATTRIB records of an INSERT, each as its values.
+    std::vector<std::vector<VelDxfValue>> children;
 
-  // Value of the first tag with the code; nullopt when absent (or not a number).
-  std::optional<std::string> text(int code) const;
-  std::optional<double> real(int code) const;
-  // The entity's XData of one application (all when null), as AcDbObject::xData answers
-  // it; null when there is none or the entity is gone. Free with acutRelRb.
-  resbuf* xData(const char* regappName) const;
+    // Value of the first tag with the code; nullopt when absent (or not a number).
+    std::optional<std::string> text(int code) const;
+    std::optional<double> real(int code) const;
+    // The entity's XData of one application (all when null), as AcDbObject::xData answers
+    // it; null when there is none or the entity is gone. Free with acutRelRb.
+    resbuf* xData(const char* regappName) const;
 };
 
 // The first tag with the code among values, as a number; nullopt when absent or not one.

@@ -15,16 +15,16 @@
 // Outcome of a write: on failure, a French sentence naming the file, what went wrong and
 // what to do, and the system's error code. A success may carry a warning.
 struct VelFileResult {
-  bool ok = true;
-  int error = 0;
-  std::string message;
-  explicit operator bool() const { return ok; }
+    bool ok = true;
+    int error = 0;
+    std::string message;
+    explicit operator bool() const { return ok; }
 };
 
 struct VelWriteOptions {
-  // The version being replaced is kept as "<path>.bak" (replacing an older one in one
-  // step); nothing is kept when the file did not exist.
-  bool keepBackup = false;
+    // The version being replaced is kept as "<path>.bak" (replacing an older one in one
+    // step); nothing is kept when the file did not exist.
+    bool keepBackup = false;
 };
 
 // Replaces `path` with `content`: the bytes go to a temporary file in the same folder,
@@ -39,43 +39,43 @@ VelFileResult velWriteFileAtomically(const std::string& path, std::string_view c
 // a file name: open(), then write() or let the library write to temporaryPath(), then
 // commit(). Without a commit (a failure, an exception) the temporary file is removed.
 class VelAtomicFile {
- public:
-  explicit VelAtomicFile(std::string path, VelWriteOptions options = {});
-  ~VelAtomicFile();
-  VelAtomicFile(const VelAtomicFile&) = delete;
-  VelAtomicFile& operator=(const VelAtomicFile&) = delete;
+public:
+    explicit VelAtomicFile(std::string path, VelWriteOptions options = {});
+    ~VelAtomicFile();
+    VelAtomicFile(const VelAtomicFile&) = delete;
+    VelAtomicFile& operator=(const VelAtomicFile&) = delete;
 
-  VelFileResult open();
-  // The temporary file; whatever writes it must leave it in place (no rename).
-  const std::string& temporaryPath() const { return temporary_; }
-  VelFileResult write(std::string_view piece);
-  VelFileResult commit();
-  // Removes the temporary file; the target is left alone.
-  void discard();
-  // The file that a commit replaces (the target of a symbolic link).
-  const std::string& target() const { return target_; }
+    VelFileResult open();
+    // The temporary file; whatever writes it must leave it in place (no rename).
+    const std::string& temporaryPath() const { return temporary_; }
+    VelFileResult write(std::string_view piece);
+    VelFileResult commit();
+    // Removes the temporary file; the target is left alone.
+    void discard();
+    // The file that a commit replaces (the target of a symbolic link).
+    const std::string& target() const { return target_; }
 
- private:
-  VelFileResult fail(const char* step, int error);
+private:
+    VelFileResult fail(const char* step, int error);
 
-  std::string path_;
-  std::string target_;
-  std::string temporary_;
-  VelWriteOptions options_;
-  int fd_ = -1;
-  bool existed_ = false;
+    std::string path_;
+    std::string target_;
+    std::string temporary_;
+    VelWriteOptions options_;
+    int fd_ = -1;
+    bool existed_ = false;
 };
 
 // What a file was when it was read: its size, modification time and a hash of its
 // content. Two identities with the same content (existence, size and hash) stand for the
 // same version, whatever their times.
 struct VelFileIdentity {
-  bool exists = false;
-  bool readable = true;  // false when the file exists but could not be read whole
-  std::uint64_t size = 0;
-  std::int64_t modified = 0;  // nanoseconds since 1970
-  std::uint64_t hash = 0;
-  bool sameContent(const VelFileIdentity& other) const;
+    bool exists = false;
+    bool readable = true; // false when the file exists but could not be read whole
+    std::uint64_t size = 0;
+    std::int64_t modified = 0; // nanoseconds since 1970
+    std::uint64_t hash = 0;
+    bool sameContent(const VelFileIdentity& other) const;
 };
 VelFileIdentity velFileIdentity(const std::string& path);
 
@@ -83,13 +83,13 @@ VelFileIdentity velFileIdentity(const std::string& path);
 // two equal stamps mean that nothing wrote, replaced or renamed the file in between (to
 // the precision of the file system's times).
 struct VelFileStamp {
-  bool exists = false;
-  std::uint64_t device = 0;
-  std::uint64_t inode = 0;
-  std::uint64_t size = 0;
-  std::int64_t modified = 0;  // nanoseconds since 1970
-  std::int64_t changed = 0;   // status change (ctime), nanoseconds since 1970
-  bool operator==(const VelFileStamp&) const = default;
+    bool exists = false;
+    std::uint64_t device = 0;
+    std::uint64_t inode = 0;
+    std::uint64_t size = 0;
+    std::int64_t modified = 0; // nanoseconds since 1970
+    std::int64_t changed = 0;  // status change (ctime), nanoseconds since 1970
+    bool operator==(const VelFileStamp&) const = default;
 };
 VelFileStamp velFileStamp(const std::string& path);
 
@@ -97,13 +97,13 @@ VelFileStamp velFileStamp(const std::string& path);
 // reader that keeps the identity needs no second reading, and a version written between
 // two readings cannot pass for the one parsed.
 struct VelFileContent {
-  std::unique_ptr<char[]> data;  // size bytes, then a NUL
-  std::size_t size = 0;
-  bool opened = false;
-  // exists and readable as velFileIdentity has them; readable is false for anything but a
-  // regular file and for one that ends before the size it announced.
-  VelFileIdentity identity;
-  int error = 0;  // the system's error code of a failed open or read
+    std::unique_ptr<char[]> data; // size bytes, then a NUL
+    std::size_t size = 0;
+    bool opened = false;
+    // exists and readable as velFileIdentity has them; readable is false for anything but a
+    // regular file and for one that ends before the size it announced.
+    VelFileIdentity identity;
+    int error = 0; // the system's error code of a failed open or read
 };
 VelFileContent velReadFile(const std::string& path);
 
@@ -125,19 +125,19 @@ bool velFileReadSince(std::uint64_t mark, const std::string& path, VelFileIdenti
 // held succeeds at once and the lock goes with the last one. Waits up to `waitSeconds`
 // for another process; locked() false with the reason in result() otherwise.
 class VelFileLock {
- public:
-  explicit VelFileLock(const std::string& path, int waitSeconds = 30);
-  ~VelFileLock();
-  VelFileLock(const VelFileLock&) = delete;
-  VelFileLock& operator=(const VelFileLock&) = delete;
-  bool locked() const { return key_ != nullptr; }
-  const VelFileResult& result() const { return result_; }
-  // The lock file of a file.
-  static std::string lockFileOf(const std::string& path);
+public:
+    explicit VelFileLock(const std::string& path, int waitSeconds = 30);
+    ~VelFileLock();
+    VelFileLock(const VelFileLock&) = delete;
+    VelFileLock& operator=(const VelFileLock&) = delete;
+    bool locked() const { return key_ != nullptr; }
+    const VelFileResult& result() const { return result_; }
+    // The lock file of a file.
+    static std::string lockFileOf(const std::string& path);
 
- private:
-  void* key_ = nullptr;
-  VelFileResult result_;
+private:
+    void* key_ = nullptr;
+    VelFileResult result_;
 };
 
 // French reason for a system error code ("disque plein", "permission refusée"...) and
@@ -149,12 +149,12 @@ std::string velFileErrorAdvice(int error);
 // of them fail as a full disk or a lost network share would; velResetFileSystemCalls()
 // puts the real ones back.
 struct VelFileSystemCalls {
-  int (*open)(const char* path, int flags, mode_t mode);
-  ssize_t (*write)(int fd, const void* data, size_t size);
-  int (*fsync)(int fd);
-  int (*close)(int fd);
-  int (*rename)(const char* from, const char* to);
-  int (*link)(const char* from, const char* to);
+    int (*open)(const char* path, int flags, mode_t mode);
+    ssize_t (*write)(int fd, const void* data, size_t size);
+    int (*fsync)(int fd);
+    int (*close)(int fd);
+    int (*rename)(const char* from, const char* to);
+    int (*link)(const char* from, const char* to);
 };
 VelFileSystemCalls& velFileSystemCalls();
 void velResetFileSystemCalls();

@@ -10,9 +10,9 @@
 #pragma GCC visibility push(default)
 
 struct VelHostSettings {
-  std::string modulesDir;   // where modules are looked for first
-  std::string profileDir;   // holds the registry file and the user's settings
-  std::string profileName;  // CPROFILE
+    std::string modulesDir;  // where modules are looked for first
+    std::string profileDir;  // holds the registry file and the user's settings
+    std::string profileName; // CPROFILE
 };
 
 VelHostSettings& velHostSettings();
@@ -23,9 +23,8 @@ std::string velDefaultProfileDir();
 // Reads a value as GetPrivateProfileString does: section and key without regard to
 // case, the value trimmed and unquoted, def (trimmed) when the file, section or key is
 // missing; at most bufferSize - 1 bytes, cut at a character boundary.
-std::string velGetPrivateProfileString(std::string_view section, std::string_view key,
-                                       std::string_view def, const std::string& fileName,
-                                       std::size_t bufferSize);
+std::string velGetPrivateProfileString(std::string_view section, std::string_view key, std::string_view def,
+                                       const std::string& fileName, std::size_t bufferSize);
 
 // Writes a value as WritePrivateProfileString does: the key's value is replaced where it
 // stands, a new key ends its section, a new section ends the file, a missing file is
@@ -33,8 +32,7 @@ std::string velGetPrivateProfileString(std::string_view section, std::string_vie
 // a null key the whole section. Texts holding a line break, a key holding "=" or a
 // section holding "]" are refused. False with errno set on failure; the file is then
 // unchanged (it is replaced only once the new one is complete).
-bool velWritePrivateProfileString(const char* section, const char* key, const char* value,
-                                  const std::string& fileName);
+bool velWritePrivateProfileString(const char* section, const char* key, const char* value, const std::string& fileName);
 
 // True for one of the seven root key names ("HKEY_CURRENT_USER"...), any case.
 bool velIsRegistryRoot(std::string_view name);
@@ -42,11 +40,11 @@ bool velIsRegistryRoot(std::string_view name);
 // Registry values, kept in the profile's "registre.reg": keys are paths of names
 // separated by "\" under a root, compared without regard to case, as value names are.
 // A query fails for an empty or missing key or value, or a value longer than maxBytes.
-bool velRegQueryValue(std::string_view root, std::string_view keyPath,
-                      std::string_view valueName, std::string& out, std::size_t maxBytes);
+bool velRegQueryValue(std::string_view root, std::string_view keyPath, std::string_view valueName, std::string& out,
+                      std::size_t maxBytes);
 // Creates the key when it does not exist and sets the value (text).
-bool velRegSetValue(std::string_view root, std::string_view keyPath,
-                    std::string_view valueName, std::string_view value);
+bool velRegSetValue(std::string_view root, std::string_view keyPath, std::string_view valueName,
+                    std::string_view value);
 // Path of the registry file, and a check of it: a refusal names the file and, for a
 // malformed file, the line.
 std::string velRegistryFile();

@@ -19,12 +19,12 @@ constexpr unsigned kVelConfigRelease = kVelWmUser + 1002; // the dialog is closi
 
 // One page of the dialog. The dialog owns the pages it creates and deletes them.
 class CVelConfigPage {
- public:
-  virtual ~CVelConfigPage() = default;
-  // Lets the user work on the page (fields, buttons); false when the user cancels.
-  virtual bool Run() = 0;
-  // A message of the dialog; answers the message's result.
-  virtual long OnMessage(unsigned message) = 0;
+public:
+    virtual ~CVelConfigPage() = default;
+    // Lets the user work on the page (fields, buttons); false when the user cancels.
+    virtual bool Run() = 0;
+    // A message of the dialog; answers the message's result.
+    virtual long OnMessage(unsigned message) = 0;
 };
 
 // The function a module exports to create its page: stores the new page in *page, made
@@ -33,19 +33,19 @@ using VelCreateConfigPageFn = void(CVelConfigPage** page, void* parent);
 
 // A page as a module registered it.
 struct VelConfigPageEntry {
-  std::string section;       // section title of the dialog
-  std::string createFunction; // exported name of the page's creation function
-  std::string moduleName;    // registering module, without its version digits
-  std::string pageTitle;
-  std::string modulePath;    // file of the module that registered it
+    std::string section;        // section title of the dialog
+    std::string createFunction; // exported name of the page's creation function
+    std::string moduleName;     // registering module, without its version digits
+    std::string pageTitle;
+    std::string modulePath; // file of the module that registered it
 };
 
 class CVelConfigServices : public AcRxService {
- public:
-  // Records a page; a second registration of the same function replaces the first.
-  virtual void RegisterConfigPage(const std::string& section, const std::string& createFunction,
-                                  const std::string& moduleName, const std::string& pageTitle) = 0;
-  virtual std::vector<VelConfigPageEntry> RegisteredPages() const = 0;
+public:
+    // Records a page; a second registration of the same function replaces the first.
+    virtual void RegisterConfigPage(const std::string& section, const std::string& createFunction,
+                                    const std::string& moduleName, const std::string& pageTitle) = 0;
+    virtual std::vector<VelConfigPageEntry> RegisteredPages() const = 0;
 };
 
 #pragma GCC visibility pop

@@ -15,8 +15,7 @@ inline constexpr const char* kVelMetreServicesName = "VelantoMetreServices r17.2
 inline constexpr const char* kVelMetreServicesModule = "VelMetre15.arx";
 
 // Fills the table with the schedule file's articles, in file order; the caller owns them.
-using VtMetre_RemplitTableauFn = std::int32_t(std::string file, std::vector<CZodEVIArticle*>* table,
-                                              std::int32_t flag);
+using VtMetre_RemplitTableauFn = std::int32_t(std::string file, std::vector<CZodEVIArticle*>* table, std::int32_t flag);
 // Writes the table's articles to the schedule file.
 using VtMetre_ExporterXmlFn = std::int32_t(std::string file, std::vector<CZodEVIArticle*>* table, std::int32_t flag);
 // Opens the editor on the file (on the article of that tree path, or everywhere) and
@@ -26,8 +25,8 @@ using VtMetre_EditerBordereauFn = std::int32_t(std::string file, std::vector<CZo
 // The names of the estimates already made.
 using VtMetre_ListeDesMetresFn = std::int32_t(std::vector<std::string>* names, std::int32_t* out);
 // Builds the estimate of that name from the lines; the lines stay the caller's.
-using VtMetre_AfficherAssocFn = std::int32_t(std::string name, std::vector<CZodEVIAssocLine*>* lines,
-                                             std::int32_t show, std::int32_t mode);
+using VtMetre_AfficherAssocFn = std::int32_t(std::string name, std::vector<CZodEVIAssocLine*>* lines, std::int32_t show,
+                                             std::int32_t mode);
 // The currency symbol of the prices.
 using VtMetre_SymbMonetaireFn = std::int32_t(std::string* symbol);
 

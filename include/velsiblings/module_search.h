@@ -6,6 +6,7 @@
 #include <string>
 #include <vector>
 
-inline std::vector<std::string> VelModuleCandidates(const std::string& file) {
-  return {file, "..\\Programmes\\" + file, "Programmes\\" + file};
+inline std::vector<std::string> VelModuleCandidates(const std::string& file)
+{
+    return {file, "..\\Programmes\\" + file, "Programmes\\" + file};
 }

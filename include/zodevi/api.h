@@ -30,19 +30,19 @@ enum : std::int32_t {
 
 // Quantity selectors of the price functions: which code pattern the item name fills.
 enum : std::int32_t {
-    kZodEVIPipeLength = 0,        // RSX_TUY_LIN_3D_%s
-    kZodEVIPipeCount = 1,         // RSX_TUY_NB_%s
-    kZodEVIDuctLength = 2,        // RSX_FRX_LIN_3D_%s
-    kZodEVIDuctCount = 3,         // RSX_FRX_NB_%s
-    kZodEVICombLength = 4,        // RSX_PGN_LIN_3D_%s
-    kZodEVICombCount = 5,         // RSX_PGN_NB_%s
-    kZodEVIFittingCount = 6,      // RSX_SBL_NB_%s
-    kZodEVIPipeSupplyLength = 7,  // RSX_TUY_FRNT_LIN_3D_%s
+    kZodEVIPipeLength = 0,         // RSX_TUY_LIN_3D_%s
+    kZodEVIPipeCount = 1,          // RSX_TUY_NB_%s
+    kZodEVIDuctLength = 2,         // RSX_FRX_LIN_3D_%s
+    kZodEVIDuctCount = 3,          // RSX_FRX_NB_%s
+    kZodEVICombLength = 4,         // RSX_PGN_LIN_3D_%s
+    kZodEVICombCount = 5,          // RSX_PGN_NB_%s
+    kZodEVIFittingCount = 6,       // RSX_SBL_NB_%s
+    kZodEVIPipeSupplyLength = 7,   // RSX_TUY_FRNT_LIN_3D_%s
     kZodEVIFittingSupplyCount = 8, // RSX_SBL_FRNT_NB_%s
-    kZodEVIMaterialVolume = 9,    // PRJ_VOL_MAT_%s
-    kZodEVIMaterialSurface = 10,  // PRJ_SFC_MAT_%s
-    kZodEVIMaterialLength = 11,   // PRJ_LIN_MAT_%s
-    kZodEVIMaterialTonnage = 12,  // PRJ_TON_MAT_%s
+    kZodEVIMaterialVolume = 9,     // PRJ_VOL_MAT_%s
+    kZodEVIMaterialSurface = 10,   // PRJ_SFC_MAT_%s
+    kZodEVIMaterialLength = 11,    // PRJ_LIN_MAT_%s
+    kZodEVIMaterialTonnage = 12,   // PRJ_TON_MAT_%s
 };
 
 #define ZODEVI_EXPORT extern "C" __attribute__((visibility("default")))
@@ -64,9 +64,8 @@ ZODEVI_EXPORT std::int32_t ZodEVI_WriteBdr();
 ZODEVI_EXPORT std::int32_t ZodEVI_UpdateBdrRsx(const std::int32_t* networkIndex, const std::string* networkName,
                                                const CZodEVIStringList* models, const CZodEVIStringList* pipeSupplies,
                                                const CZodEVIStringList* fittings,
-                                               const CZodEVIStringList* fittingSupplies,
-                                               const CZodEVIStringList* ducts, const CZodEVIStringList* materials,
-                                               const CZodEVIRealArray* depthBounds);
+                                               const CZodEVIStringList* fittingSupplies, const CZodEVIStringList* ducts,
+                                               const CZodEVIStringList* materials, const CZodEVIRealArray* depthBounds);
 // Re-applies depth classes to every network of the schedule.
 ZODEVI_EXPORT std::int32_t ZodEVI_UpdateBdrTnePf(const CZodEVIRealArray* depthBounds);
 // Comb-duct models.
@@ -81,8 +80,8 @@ ZODEVI_EXPORT std::int32_t ZodEVI_UpdateBdrEpVeg(const CZodEVIRealArray* thickne
 ZODEVI_EXPORT std::int32_t ZodEVI_UpdateBdrEpRbt(const CZodEVIRealArray* classLimits);
 // Unit price of the article counting a quantity; an empty network name means the
 // general network group. kZodEVINotFound (price set to 0) when none counts it.
-ZODEVI_EXPORT std::int32_t ZodEVI_GetBdrPrice(const std::int32_t* selector, const std::string* itemName,
-                                              double* price, std::string networkName);
+ZODEVI_EXPORT std::int32_t ZodEVI_GetBdrPrice(const std::int32_t* selector, const std::string* itemName, double* price,
+                                              std::string networkName);
 // Network name -> price text of every network group with such an article; the map is
 // emptied first, whatever the answer.
 ZODEVI_EXPORT std::int32_t ZodEVI_GetBdrPriceRsx(const std::int32_t* selector, const std::string* itemName,

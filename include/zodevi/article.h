@@ -75,9 +75,18 @@ namespace zodevi_fields {
 using T = CZodEVIArticleField::Type;
 using A = CZodEVIArticle;
 
-constexpr CZodEVIArticleField Text(const char* name, std::string A::*m) { return {name, T::Text, m, nullptr, nullptr}; }
-constexpr CZodEVIArticleField Real(const char* name, double A::*m) { return {name, T::Real, nullptr, m, nullptr}; }
-constexpr CZodEVIArticleField Int(const char* name, int A::*m) { return {name, T::Int, nullptr, nullptr, m}; }
+constexpr CZodEVIArticleField Text(const char* name, std::string A::*m)
+{
+    return {name, T::Text, m, nullptr, nullptr};
+}
+constexpr CZodEVIArticleField Real(const char* name, double A::*m)
+{
+    return {name, T::Real, nullptr, m, nullptr};
+}
+constexpr CZodEVIArticleField Int(const char* name, int A::*m)
+{
+    return {name, T::Int, nullptr, nullptr, m};
+}
 
 } // namespace zodevi_fields
 
@@ -85,30 +94,54 @@ inline const std::array<CZodEVIArticleField, 48>& ArticleFields()
 {
     using namespace zodevi_fields;
     static const std::array<CZodEVIArticleField, 48> fields = {
-        Text("code", &A::code),             Real("unitPrice", &A::unitPrice),
-        Real("metreReal1", &A::metreReal1), Real("taxRate", &A::taxRate),
-        Real("metreReal2", &A::metreReal2), Text("metreText1", &A::metreText1),
-        Int("number", &A::number),          Int("metreInt1", &A::metreInt1),
-        Text("metreText2", &A::metreText2), Int("nature", &A::nature),
-        Text("designation", &A::designation), Text("metreText3", &A::metreText3),
-        Text("unit", &A::unit),             Text("quantityKey", &A::quantityKey),
-        Text("description", &A::description), Int("metreInt2", &A::metreInt2),
-        Int("metreInt3", &A::metreInt3),    Text("metreText4", &A::metreText4),
-        Int("metreInt4", &A::metreInt4),    Text("groupKey", &A::groupKey),
-        Int("metreInt5", &A::metreInt5),    Int("metreInt6", &A::metreInt6),
-        Int("metreInt7", &A::metreInt7),    Text("metreText5", &A::metreText5),
-        Int("metreInt8", &A::metreInt8),    Real("metreReal3", &A::metreReal3),
-        Real("metreReal4", &A::metreReal4), Int("metreInt9", &A::metreInt9),
-        Text("metreText6", &A::metreText6), Int("metreInt10", &A::metreInt10),
-        Text("metreText7", &A::metreText7), Int("metreInt11", &A::metreInt11),
-        Text("metreText8", &A::metreText8), Text("metreText9", &A::metreText9),
-        Real("metreReal5", &A::metreReal5), Int("metreInt12", &A::metreInt12),
-        Text("metreText10", &A::metreText10), Text("metreText11", &A::metreText11),
-        Real("metreReal6", &A::metreReal6), Real("metreReal7", &A::metreReal7),
-        Real("metreReal8", &A::metreReal8), Int("metreInt13", &A::metreInt13),
-        Text("metreText12", &A::metreText12), Int("metreInt14", &A::metreInt14),
-        Real("metreReal9", &A::metreReal9), Real("metreReal10", &A::metreReal10),
-        Real("metreReal11", &A::metreReal11), Text("treePath", &A::treePath),
+        Text("code", &A::code),
+        Real("unitPrice", &A::unitPrice),
+        Real("metreReal1", &A::metreReal1),
+        Real("taxRate", &A::taxRate),
+        Real("metreReal2", &A::metreReal2),
+        Text("metreText1", &A::metreText1),
+        Int("number", &A::number),
+        Int("metreInt1", &A::metreInt1),
+        Text("metreText2", &A::metreText2),
+        Int("nature", &A::nature),
+        Text("designation", &A::designation),
+        Text("metreText3", &A::metreText3),
+        Text("unit", &A::unit),
+        Text("quantityKey", &A::quantityKey),
+        Text("description", &A::description),
+        Int("metreInt2", &A::metreInt2),
+        Int("metreInt3", &A::metreInt3),
+        Text("metreText4", &A::metreText4),
+        Int("metreInt4", &A::metreInt4),
+        Text("groupKey", &A::groupKey),
+        Int("metreInt5", &A::metreInt5),
+        Int("metreInt6", &A::metreInt6),
+        Int("metreInt7", &A::metreInt7),
+        Text("metreText5", &A::metreText5),
+        Int("metreInt8", &A::metreInt8),
+        Real("metreReal3", &A::metreReal3),
+        Real("metreReal4", &A::metreReal4),
+        Int("metreInt9", &A::metreInt9),
+        Text("metreText6", &A::metreText6),
+        Int("metreInt10", &A::metreInt10),
+        Text("metreText7", &A::metreText7),
+        Int("metreInt11", &A::metreInt11),
+        Text("metreText8", &A::metreText8),
+        Text("metreText9", &A::metreText9),
+        Real("metreReal5", &A::metreReal5),
+        Int("metreInt12", &A::metreInt12),
+        Text("metreText10", &A::metreText10),
+        Text("metreText11", &A::metreText11),
+        Real("metreReal6", &A::metreReal6),
+        Real("metreReal7", &A::metreReal7),
+        Real("metreReal8", &A::metreReal8),
+        Int("metreInt13", &A::metreInt13),
+        Text("metreText12", &A::metreText12),
+        Int("metreInt14", &A::metreInt14),
+        Real("metreReal9", &A::metreReal9),
+        Real("metreReal10", &A::metreReal10),
+        Real("metreReal11", &A::metreReal11),
+        Text("treePath", &A::treePath),
     };
     return fields;
 }

@@ -11,7 +11,7 @@ enum : int {
     kProjectLumpSum = 0,  // the pseudo-project "**Forfait"
     kProjectPlatform = 1, // a platform, or the pseudo-project "**Voirie"
     kProjectRoad = 2,
-    kProjectNetwork = 3,  // a network project, or a network's lump sums under its name
+    kProjectNetwork = 3, // a network project, or a network's lump sums under its name
     kProjectKorvane = 4,
 };
 

@@ -16,28 +16,28 @@ namespace {
 constexpr const char* kGroup = "VELANTO_CONFIGURATION";
 
 class ConfigServices final : public CVelConfigServices {
- public:
-  const char* className() const override { return "CVelConfigServices"; }
+public:
+    const char* className() const override { return "CVelConfigServices"; }
 
-  void RegisterConfigPage(const std::string& section, const std::string& createFunction,
-                          const std::string& moduleName, const std::string& pageTitle) override
-  {
-      // The page's function lives in the module that registers it, which is the one
-      // the host is running now.
-      VelConfigPageEntry entry{section, createFunction, moduleName, pageTitle, acedGetAppName()};
-      for (VelConfigPageEntry& existing : pages_) {
-          if (existing.createFunction == createFunction) {
-              existing = entry;
-              return;
-          }
-      }
-      pages_.push_back(entry);
-  }
+    void RegisterConfigPage(const std::string& section, const std::string& createFunction,
+                            const std::string& moduleName, const std::string& pageTitle) override
+    {
+        // The page's function lives in the module that registers it, which is the one
+        // the host is running now.
+        VelConfigPageEntry entry{section, createFunction, moduleName, pageTitle, acedGetAppName()};
+        for (VelConfigPageEntry& existing : pages_) {
+            if (existing.createFunction == createFunction) {
+                existing = entry;
+                return;
+            }
+        }
+        pages_.push_back(entry);
+    }
 
-  std::vector<VelConfigPageEntry> RegisteredPages() const override { return pages_; }
+    std::vector<VelConfigPageEntry> RegisteredPages() const override { return pages_; }
 
- private:
-  std::vector<VelConfigPageEntry> pages_;
+private:
+    std::vector<VelConfigPageEntry> pages_;
 };
 
 ConfigServices* g_services = nullptr;
@@ -45,8 +45,8 @@ ConfigServices* g_services = nullptr;
 // The creation function of a page, in the module that registered it (still loaded).
 VelCreateConfigPageFn* PageFunction(const VelConfigPageEntry& entry)
 {
-    void* handle = entry.modulePath.empty() ? dlopen(nullptr, RTLD_NOW)
-                                            : dlopen(entry.modulePath.c_str(), RTLD_NOW | RTLD_NOLOAD);
+    void* handle =
+        entry.modulePath.empty() ? dlopen(nullptr, RTLD_NOW) : dlopen(entry.modulePath.c_str(), RTLD_NOW | RTLD_NOLOAD);
     if (handle == nullptr)
         return nullptr;
     void* symbol = dlsym(handle, entry.createFunction.c_str());

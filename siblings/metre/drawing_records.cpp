@@ -82,8 +82,8 @@ std::optional<double> ProjectTables::Quantity(int projectKind, const std::string
 bool RecordEstimate(AcDbDatabase& database, const EstimateRecord& record, std::string& error)
 {
     const auto refused = [&](const char* what, Acad::ErrorStatus status) {
-        error = FormatString("Le devis « %s » n'est pas enregistré dans le dessin : %s (%s).", record.name.c_str(), what,
-                             acadErrorStatusText(status));
+        error = FormatString("Le devis « %s » n'est pas enregistré dans le dessin : %s (%s).", record.name.c_str(),
+                             what, acadErrorStatusText(status));
         return false;
     };
     AcDbDictionary* named = nullptr;

@@ -73,14 +73,16 @@ std::vector<CZodEVILineProject> ProjectsOfLine(const CZodEVIAssocLine& line, con
         std::size_t start = 0;
         for (;;) {
             const std::size_t comma = line.projects.find(',', start);
-            names.push_back(line.projects.substr(start, comma == std::string::npos ? std::string::npos : comma - start));
+            names.push_back(
+                line.projects.substr(start, comma == std::string::npos ? std::string::npos : comma - start));
             if (comma == std::string::npos)
                 break;
             start = comma + 1;
         }
     }
     for (std::string& name : names) {
-        const std::optional<int> kind = IsPseudoProject(name) ? std::nullopt : projects.KindHolding(line.projectKind, name);
+        const std::optional<int> kind =
+            IsPseudoProject(name) ? std::nullopt : projects.KindHolding(line.projectKind, name);
         pairs.push_back({std::move(name), kind.value_or(line.projectKind)});
     }
     return pairs;
@@ -176,8 +178,8 @@ std::vector<SheetRow> SheetRows(const Estimate& estimate)
     return rows;
 }
 
-const char* const kHeaders[] = {"N° de prix", "Désignation", "Unité", "Quantité", "Prix unitaire HT", "Montant HT",
-                                "Taux TVA"};
+const char* const kHeaders[] = {"N° de prix",       "Désignation", "Unité",   "Quantité",
+                                "Prix unitaire HT", "Montant HT",  "Taux TVA"};
 
 std::string Cell(char column, std::size_t row)
 {
@@ -193,8 +195,8 @@ std::string SumOfCells(const std::vector<std::string>& cells)
         return "SUM(" + JoinStrings(cells, ",") + ")";
     std::vector<std::string> parts;
     for (std::size_t i = 0; i < cells.size(); i += 200)
-        parts.push_back(SumOfCells(std::vector<std::string>(cells.begin() + i,
-                                                            cells.begin() + std::min(cells.size(), i + 200))));
+        parts.push_back(
+            SumOfCells(std::vector<std::string>(cells.begin() + i, cells.begin() + std::min(cells.size(), i + 200))));
     return SumOfCells(parts);
 }
 
@@ -283,7 +285,9 @@ std::string ProjectKindName(int kind)
 // sans-serif fonts, so that a row is rather too tall than cutting a line off.
 double CharWidth(unsigned char lead)
 {
-    const auto in = [lead](std::string_view set) { return set.find(static_cast<char>(lead)) != std::string_view::npos; };
+    const auto in = [lead](std::string_view set) {
+        return set.find(static_cast<char>(lead)) != std::string_view::npos;
+    };
     if (lead >= 0x80)
         return 1.0; // accented letters, mostly lower case
     if (in("ijlI'|J"))
@@ -365,9 +369,9 @@ Estimate BuildEstimate(const std::string& name, const std::vector<CZodEVIAssocLi
         row.quantityKey = line->quantityKey;
         row.taxRate = article != nullptr && std::isfinite(article->taxRate) ? article->taxRate : kDefaultTaxRate;
         if (article == nullptr || !std::isfinite(article->taxRate)) {
-            const std::string check = FormatString("%s, TVA %s %%",
-                                                   article == nullptr ? "article absent du bordereau" : "taux de TVA illisible",
-                                                   FrenchNumber(kDefaultTaxRate, -1).c_str());
+            const std::string check = FormatString(
+                "%s, TVA %s %%", article == nullptr ? "article absent du bordereau" : "taux de TVA illisible",
+                FrenchNumber(kDefaultTaxRate, -1).c_str());
             estimate.warnings.push_back(FormatString("« %s » : %s.", line->label.c_str(), check.c_str()));
             row.checks.push_back(check);
         }
@@ -375,13 +379,14 @@ Estimate BuildEstimate(const std::string& name, const std::vector<CZodEVIAssocLi
         double quantity = 0;
         for (const QuantitySource& source : row.sources) {
             quantity += source.quantity;
-            if (source.origin == QuantitySource::Origin::MissingProject || source.origin == QuantitySource::Origin::MissingKey) {
-                const std::string check =
-                    source.origin == QuantitySource::Origin::MissingProject
-                        ? FormatString("projet « %s » absent du dessin", source.project.c_str())
-                        : FormatString("quantité %s absente du projet « %s »", line->quantityKey.c_str(),
-                                       source.project.c_str());
-                estimate.warnings.push_back(FormatString("« %s » : %s, quantité 0.", line->label.c_str(), check.c_str()));
+            if (source.origin == QuantitySource::Origin::MissingProject ||
+                source.origin == QuantitySource::Origin::MissingKey) {
+                const std::string check = source.origin == QuantitySource::Origin::MissingProject
+                                              ? FormatString("projet « %s » absent du dessin", source.project.c_str())
+                                              : FormatString("quantité %s absente du projet « %s »",
+                                                             line->quantityKey.c_str(), source.project.c_str());
+                estimate.warnings.push_back(
+                    FormatString("« %s » : %s, quantité 0.", line->label.c_str(), check.c_str()));
                 row.checks.push_back(check);
             }
         }
@@ -473,8 +478,8 @@ std::vector<std::string> EstimateSummary(const Estimate& estimate, const std::st
     if (checked == 0)
         out.push_back("  Aucune ligne à vérifier avant envoi.");
     else
-        out.push_back(FormatString("  À vérifier avant envoi : %zu ligne(s), voir la feuille « À vérifier » du classeur.",
-                                   checked));
+        out.push_back(FormatString(
+            "  À vérifier avant envoi : %zu ligne(s), voir la feuille « À vérifier » du classeur.", checked));
     for (const std::string& warning : estimate.warnings)
         out.push_back("  Attention : " + warning);
     out.push_back("  Classeur : " + workbookPath);
@@ -635,7 +640,8 @@ std::string HeaderText(std::string_view text)
 std::string PageHeader(const Estimate& estimate)
 {
     const std::string drawing = std::filesystem::path(estimate.drawing).filename().string();
-    return "&L" + HeaderText("Devis : " + estimate.name) + "&C" + HeaderText(drawing) + "&R" + HeaderText(estimate.date);
+    return "&L" + HeaderText("Devis : " + estimate.name) + "&C" + HeaderText(drawing) + "&R" +
+           HeaderText(estimate.date);
 }
 
 // A4, one page wide, the heading row on every page, the estimate, the drawing and the
@@ -818,9 +824,7 @@ void WriteSummarySheet(lxw_worksheet* sheet, const Estimate& estimate, const Est
                                     estimate.totalExclTax == 0 ? 0 : chapter.subtotal / estimate.totalExclTax);
     }
     WriteText(sheet, static_cast<lxw_row_t>(totalRow), 0, "Total HT", f.bold);
-    const std::string total = estimate.chapters.empty()
-                                  ? "=0"
-                                  : FormatString("=SUM(B%zu:B%zu)", first + 1, totalRow);
+    const std::string total = estimate.chapters.empty() ? "=0" : FormatString("=SUM(B%zu:B%zu)", first + 1, totalRow);
     worksheet_write_formula_num(sheet, static_cast<lxw_row_t>(totalRow), 1, total.c_str(), f.moneyBold,
                                 estimate.totalExclTax);
     SetUpPrinting(sheet, estimate, 2, static_cast<lxw_row_t>(totalRow), 2, false);

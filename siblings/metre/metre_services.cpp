@@ -137,8 +137,8 @@ int ShowEstimate(const std::string& name, const std::vector<CZodEVIAssocLine*>* 
         }
     }
     std::string error;
-    const EstimateRecord record{name, workbook, csv, static_cast<int>(estimate.RowCount()), estimate.totalExclTax,
-                                estimate.totalInclTax};
+    const EstimateRecord record{
+        name, workbook, csv, static_cast<int>(estimate.RowCount()), estimate.totalExclTax, estimate.totalInclTax};
     const bool recorded = RecordEstimate(*database, record, error);
 
     for (const std::string& line : EstimateSummary(estimate, currency, workbook, csv))

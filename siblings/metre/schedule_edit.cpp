@@ -283,15 +283,16 @@ std::string DecodeTableValue(std::string_view text)
     return out;
 }
 
-std::string ScheduleTable(const ArticleVector& articles, const std::string& path, const std::string& treePath, int& line)
+std::string ScheduleTable(const ArticleVector& articles, const std::string& path, const std::string& treePath,
+                          int& line)
 {
-    std::string out = FormatString(
-        "# Bordereau des prix : %s\n"
-        "# Un bloc par article, un champ par ligne (« nom = valeur »). Supprimer un bloc supprime\n"
-        "# l'article ; un bloc qui commence par [nouveau] ajoute un article (treePath exigé).\n"
-        "# Dans les valeurs, \\n, \\r et \\t sont le saut de ligne, le retour chariot et la tabulation.\n"
-        "# Enregistrer et quitter valide le tableau ; quitter sans enregistrer n'y change rien.\n",
-        path.c_str());
+    std::string out =
+        FormatString("# Bordereau des prix : %s\n"
+                     "# Un bloc par article, un champ par ligne (« nom = valeur »). Supprimer un bloc supprime\n"
+                     "# l'article ; un bloc qui commence par [nouveau] ajoute un article (treePath exigé).\n"
+                     "# Dans les valeurs, \\n, \\r et \\t sont le saut de ligne, le retour chariot et la tabulation.\n"
+                     "# Enregistrer et quitter valide le tableau ; quitter sans enregistrer n'y change rien.\n",
+                     path.c_str());
     int current = 6;
     line = 1;
     const auto& fields = ArticleFields();
@@ -382,10 +383,10 @@ bool ParseScheduleTable(std::string_view text, const std::string& name, Schedule
         if (block->original && value == EncodeTableValue(FieldText(*original[*block->original], *field)))
             continue;
         if (!ScheduleEdit::SetEntryField(*block, *field, DecodeTableValue(value)))
-            return fail(lineNumber, FormatString("champ « %s » : %s attendu, « %s » trouvé", fieldName.c_str(),
-                                                 field->type == CZodEVIArticleField::Type::Int ? "nombre entier"
-                                                                                              : "nombre",
-                                                 std::string(value).c_str()));
+            return fail(lineNumber,
+                        FormatString("champ « %s » : %s attendu, « %s » trouvé", fieldName.c_str(),
+                                     field->type == CZodEVIArticleField::Type::Int ? "nombre entier" : "nombre",
+                                     std::string(value).c_str()));
     }
     std::size_t newIndex = 0;
     for (ScheduleEdit::Entry& entry : entries) {

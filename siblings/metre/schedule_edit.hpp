@@ -71,7 +71,8 @@ std::string DecodeTableValue(std::string_view text);
 
 // The table shown in the terminal editor; `line` receives the line of the article with
 // that tree path (1 when none is asked or found).
-std::string ScheduleTable(const ArticleVector& articles, const std::string& path, const std::string& treePath, int& line);
+std::string ScheduleTable(const ArticleVector& articles, const std::string& path, const std::string& treePath,
+                          int& line);
 
 // Reads an edited table into a new session; false with a French message naming the table,
 // the line and what was expected, and `errorLine` the line to show again.

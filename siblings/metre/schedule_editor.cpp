@@ -65,7 +65,6 @@ void ScriptError(const VelInputLine& line, const std::string& what)
     acutPrintf("Bordereau, ligne %d du script : %s ; rien n'est modifié.\n", line.lineNumber, what.c_str());
 }
 
-
 // The session's changes made on a newer version of the file: deletions and additions by
 // tree path, modifications field by field, so that what another user changed in the same
 // article stays unless the session changed that very field. The changes then carry the
@@ -101,7 +100,6 @@ ArticleVector Rebase(const ArticleVector& original, ArticleVector newer, std::ve
     }
     return newer;
 }
-
 
 // Writes the session under the file's lock, unless another program changed the file since
 // the session read it: a script stops there; a user chooses between making the changes
@@ -221,8 +219,7 @@ bool RunScriptedSession(ScheduleEdit& edit, const std::string& treePath)
     if (!treePath.empty())
         acutPrintf("Bordereau : article %s\n", treePath.c_str());
     for (;;) {
-        const std::optional<VelInputLine> line =
-            velUI().readLine("Bordereau [supprimer/ajouter/champ/fin/annuler] : ");
+        const std::optional<VelInputLine> line = velUI().readLine("Bordereau [supprimer/ajouter/champ/fin/annuler] : ");
         if (!line) {
             acutPrintf("Bordereau : saisie interrompue avant « fin » ; rien n'est modifié.\n");
             return false;

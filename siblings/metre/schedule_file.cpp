@@ -206,8 +206,7 @@ class ScheduleWriter {
 public:
     explicit ScheduleWriter(std::size_t expected)
         : text_(std::make_unique_for_overwrite<char[]>(expected)), capacity_(expected)
-    {
-    }
+    {}
 
     void Article(const CZodEVIArticle& article)
     {
@@ -395,7 +394,6 @@ std::string FieldText(const CZodEVIArticle& article, const CZodEVIArticleField& 
     return {};
 }
 
-
 namespace {
 
 // The schedule as this module writes it, read straight from the text without a document
@@ -408,8 +406,7 @@ class DirectReader {
 public:
     explicit DirectReader(std::string_view text)
         : p_(text.data()), end_(text.data() + text.size()), openings_(Openings())
-    {
-    }
+    {}
 
     bool Read(ArticleVector& out)
     {
@@ -588,12 +585,12 @@ private:
             scratch_ += static_cast<char>(code);
             return true;
         }
-        const char c = Take("&quot;") ? '"'
-                     : Take("&amp;")  ? '&'
-                     : Take("&lt;")   ? '<'
-                     : Take("&gt;")   ? '>'
-                     : Take("&apos;") ? '\''
-                                      : '\0';
+        const char c = Take("&quot;")   ? '"'
+                       : Take("&amp;")  ? '&'
+                       : Take("&lt;")   ? '<'
+                       : Take("&gt;")   ? '>'
+                       : Take("&apos;") ? '\''
+                                        : '\0';
         if (c == '\0')
             return false;
         scratch_ += c;
@@ -643,10 +640,10 @@ FileResult ParseArticles(char* buffer, std::size_t size, std::string_view text, 
                                                 LineOfOffset(text, parsed.offset), ParseProblem(parsed).c_str()));
     const pugi::xml_node root = document.document_element();
     if (std::strcmp(root.name(), kScheduleRoot) != 0)
-        return FileResult::Failure(FormatString("Bordereau « %s », ligne %d : élément racine <%s> attendu, <%s> trouvé ; "
-                                                "ce fichier n'est pas un bordereau.",
-                                                name.c_str(), LineOfOffset(text, root.offset_debug()), kScheduleRoot,
-                                                root.name()));
+        return FileResult::Failure(
+            FormatString("Bordereau « %s », ligne %d : élément racine <%s> attendu, <%s> trouvé ; "
+                         "ce fichier n'est pas un bordereau.",
+                         name.c_str(), LineOfOffset(text, root.offset_debug()), kScheduleRoot, root.name()));
     // Articles past the end of the root would be lost at the next write.
     if (const pugi::xml_node other = root.next_sibling())
         return FileResult::Failure(FormatString("Bordereau « %s », ligne %d : élément <%s> après la fin de <%s> ; un "
@@ -661,11 +658,10 @@ FileResult ParseArticles(char* buffer, std::size_t size, std::string_view text, 
         // Counting lines is only worth it for a message: it would make reading quadratic.
         const auto lineOf = [&] { return LineOfOffset(text, node.offset_debug()); };
         if (node.type() != pugi::node_element || std::strcmp(node.name(), kScheduleArticle) != 0)
-            return FileResult::Failure(FormatString("Bordereau « %s », ligne %d : élément <%s> attendu, %s trouvé.",
-                                                    name.c_str(), lineOf(), kScheduleArticle,
-                                                    node.type() == pugi::node_element
-                                                        ? FormatString("<%s>", node.name()).c_str()
-                                                        : "du texte"));
+            return FileResult::Failure(FormatString(
+                "Bordereau « %s », ligne %d : élément <%s> attendu, %s trouvé.", name.c_str(), lineOf(),
+                kScheduleArticle,
+                node.type() == pugi::node_element ? FormatString("<%s>", node.name()).c_str() : "du texte"));
         auto article = std::make_unique<CZodEVIArticle>();
         std::uint64_t seen = 0;
         std::size_t expected = 0;
@@ -677,24 +673,26 @@ FileResult ParseArticles(char* buffer, std::size_t size, std::string_view text, 
                 break;
             const std::size_t position = FieldOf(attributeName, expected, parsedText, fields, packedNames);
             if (position == fields.size())
-                return FileResult::Failure(FormatString("Bordereau « %s », ligne %d : article %zu, champ inconnu « %s ».",
-                                                        name.c_str(), lineOf(), read.size() + 1, attributeName));
+                return FileResult::Failure(
+                    FormatString("Bordereau « %s », ligne %d : article %zu, champ inconnu « %s ».", name.c_str(),
+                                 lineOf(), read.size() + 1, attributeName));
             if (seen & (std::uint64_t{1} << position))
-                return FileResult::Failure(FormatString("Bordereau « %s », ligne %d : article %zu, champ « %s » en double.",
-                                                        name.c_str(), lineOf(), read.size() + 1, attribute.name()));
+                return FileResult::Failure(
+                    FormatString("Bordereau « %s », ligne %d : article %zu, champ « %s » en double.", name.c_str(),
+                                 lineOf(), read.size() + 1, attribute.name()));
             seen |= std::uint64_t{1} << position;
             if (!SetFieldValue(*article, fields[position], attribute.value()))
-                return FileResult::Failure(FormatString(
-                    "Bordereau « %s », ligne %d : article %zu, champ « %s » : %s attendu, « %s » trouvé.", name.c_str(),
-                    lineOf(), read.size() + 1, attribute.name(),
-                    fields[position].type == CZodEVIArticleField::Type::Int ? "nombre entier" : "nombre",
-                    attribute.value()));
+                return FileResult::Failure(
+                    FormatString("Bordereau « %s », ligne %d : article %zu, champ « %s » : %s attendu, « %s » trouvé.",
+                                 name.c_str(), lineOf(), read.size() + 1, attribute.name(),
+                                 fields[position].type == CZodEVIArticleField::Type::Int ? "nombre entier" : "nombre",
+                                 attribute.value()));
             expected = position + 1;
         }
         if (node.first_child())
-            return FileResult::Failure(FormatString("Bordereau « %s », ligne %d : article %zu, contenu inattendu dans <%s>.",
-                                                    name.c_str(), LineOfOffset(text, node.first_child().offset_debug()),
-                                                    read.size() + 1, kScheduleArticle));
+            return FileResult::Failure(
+                FormatString("Bordereau « %s », ligne %d : article %zu, contenu inattendu dans <%s>.", name.c_str(),
+                             LineOfOffset(text, node.first_child().offset_debug()), read.size() + 1, kScheduleArticle));
         read.push_back(std::move(article));
     }
     out.reserve(out.size() + read.size());

@@ -13,8 +13,8 @@
 namespace {
 
 class CVelReseDimSrv final : public AcRxService {
- public:
-  const char* className() const override { return "CVelReseDimSrv"; }
+public:
+    const char* className() const override { return "CVelReseDimSrv"; }
 };
 
 CVelReseDimSrv* g_service = nullptr;

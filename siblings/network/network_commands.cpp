@@ -111,7 +111,8 @@ bool WriteRecordsCommand()
     const int status = WriteNetworkQuantities(*database, report, warnings);
     PrintWarnings(warnings);
     for (const RecordReport::Written& w : report.written)
-        acutPrintf("\nRéseau %s, projet « %s » : %s m de canalisations, %zu regard(s) ou accessoire(s), %zu quantité(s) enregistrée(s).",
+        acutPrintf("\nRéseau %s, projet « %s » : %s m de canalisations, %zu regard(s) ou accessoire(s), %zu "
+                   "quantité(s) enregistrée(s).",
                    w.network.c_str(), w.project.c_str(), FormatReal(w.pipeLength, 2).c_str(), w.fittings, w.quantities);
     for (const std::string& removed : report.removed)
         acutPrintf("\nProjet « %s » retiré du métré : plus aucun élément dans le dessin.", removed.c_str());

@@ -16,8 +16,11 @@ struct KindName {
 };
 
 constexpr KindName kKinds[] = {
-    {ElementKind::Pipe, "TUY"},         {ElementKind::Duct, "FRX"}, {ElementKind::PipeSupply, "TUY_FRNT"},
-    {ElementKind::Fitting, "SBL"},      {ElementKind::FittingSupply, "SBL_FRNT"},
+    {ElementKind::Pipe, "TUY"},
+    {ElementKind::Duct, "FRX"},
+    {ElementKind::PipeSupply, "TUY_FRNT"},
+    {ElementKind::Fitting, "SBL"},
+    {ElementKind::FittingSupply, "SBL_FRNT"},
 };
 
 struct Vertex {
@@ -194,7 +197,7 @@ bool MeasureEntity(const VelEntity& entity, Lengths& lengths, std::string& why)
         const bool threeD = (flags & 8) != 0;
         std::vector<Vertex> vertices;
         for (const auto& child : entity.children) {
-            if (Flags(child) & 16)  // frame point of a spline-fit polyline, not on the curve
+            if (Flags(child) & 16) // frame point of a spline-fit polyline, not on the curve
                 continue;
             Vertex v;
             const auto x = velDxfReal(child, 10), y = velDxfReal(child, 20);
@@ -261,8 +264,8 @@ void NetworkDrawing::Add(const VelEntity& entity, const resbuf* xdata)
         else if (item->restype == kXdDist)
             sizes.push_back(item->resval.rreal);
         else
-            warnings.push_back(FormatString("%s : donnée %d inattendue après le modèle, non utilisée.", Where(entity).c_str(),
-                                            item->restype));
+            warnings.push_back(FormatString("%s : donnée %d inattendue après le modèle, non utilisée.",
+                                            Where(entity).c_str(), item->restype));
     }
     const std::size_t maxDepths = IsLinear(*kind) ? 2 : 1;
     for (std::size_t i = 0; i < depths.size(); ++i) {
@@ -278,9 +281,9 @@ void NetworkDrawing::Add(const VelEntity& entity, const resbuf* xdata)
     if (IsLinear(*kind)) {
         for (std::size_t i = 0; i < sizes.size() && i < 2; ++i) {
             if (!ValidLength(sizes[i])) {
-                warnings.push_back(FormatString("%s : %s %s non utilisée (nombre de mètres positif attendu).",
-                                                Where(entity).c_str(), i == 0 ? "longueur utile" : "largeur de tranchée",
-                                                FormatRealShortest(sizes[i]).c_str()));
+                warnings.push_back(FormatString(
+                    "%s : %s %s non utilisée (nombre de mètres positif attendu).", Where(entity).c_str(),
+                    i == 0 ? "longueur utile" : "largeur de tranchée", FormatRealShortest(sizes[i]).c_str()));
                 continue;
             }
             (i == 0 ? element.usefulLength : element.trenchWidth) = sizes[i];

@@ -43,9 +43,9 @@ struct Element {
     ElementKind kind = ElementKind::Pipe;
     std::string model;
     AcDbHandle handle = 0;
-    double length3d = 0;  // linear kinds only
+    double length3d = 0; // linear kinds only
     double length2d = 0;
-    std::optional<double> depthStart;  // metres below the ground
+    std::optional<double> depthStart; // metres below the ground
     std::optional<double> depthEnd;
     double usefulLength = kDefaultUsefulLength;
     double trenchWidth = kDefaultTrenchWidth;
@@ -59,7 +59,7 @@ struct Project {
 struct Network {
     std::string name;
     int index = 0;
-    std::vector<Project> projects;  // in order of first appearance
+    std::vector<Project> projects; // in order of first appearance
 
     // Distinct models of one kind over all projects, first spelling and first appearance.
     std::vector<std::string> Models(ElementKind kind) const;
@@ -76,7 +76,7 @@ bool MeasureEntity(const VelEntity& entity, Lengths& lengths, std::string& why);
 // The networks of a drawing. Names of networks and projects are matched without regard
 // to case (the first spelling is kept), as the schedule and the drawing's dictionaries do.
 struct NetworkDrawing {
-    std::vector<Network> networks;  // in order of first appearance
+    std::vector<Network> networks; // in order of first appearance
     // One French line per entity left out or value not used, naming the entity's handle.
     std::vector<std::string> warnings;
 

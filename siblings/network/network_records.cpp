@@ -106,7 +106,7 @@ bool OpenOrCreate(AcDbDictionary* parent, const char* key, AcDbDictionary*& out,
         error = FormatString("dictionnaire %s impossible à créer (%s)", key, acadErrorStatusText(status));
         return false;
     }
-    out = created.release();  // the drawing owns it now, open for write
+    out = created.release(); // the drawing owns it now, open for write
     return true;
 }
 
@@ -127,7 +127,8 @@ bool WriteRecord(AcDbDictionary* projects, const std::string& name, const std::v
             record = created.release();
     }
     if (status != Acad::eOk) {
-        error = FormatString("enregistrement du projet « %s » impossible (%s)", name.c_str(), acadErrorStatusText(status));
+        error =
+            FormatString("enregistrement du projet « %s » impossible (%s)", name.c_str(), acadErrorStatusText(status));
         return false;
     }
     Closer closer{record};
@@ -152,16 +153,26 @@ std::vector<Quantity> ProjectQuantities(const Project& project, const std::vecto
     ByModel pipes, ducts, pipeSupplies, fittings, fittingSupplies;
     double totalLength = 0, trenchVolume = 0;
     bool anyDepth = false;
-    const std::size_t classes = depthBounds.empty() ? 0 : depthBounds.size();  // pairs, then "over the last"
+    const std::size_t classes = depthBounds.empty() ? 0 : depthBounds.size(); // pairs, then "over the last"
     std::vector<double> classLength(classes, 0.0), classVolume(classes, 0.0);
     for (const Element& element : project.elements) {
         ByModel* family = nullptr;
         switch (element.kind) {
-        case ElementKind::Pipe: family = &pipes; break;
-        case ElementKind::Duct: family = &ducts; break;
-        case ElementKind::PipeSupply: family = &pipeSupplies; break;
-        case ElementKind::Fitting: family = &fittings; break;
-        case ElementKind::FittingSupply: family = &fittingSupplies; break;
+        case ElementKind::Pipe:
+            family = &pipes;
+            break;
+        case ElementKind::Duct:
+            family = &ducts;
+            break;
+        case ElementKind::PipeSupply:
+            family = &pipeSupplies;
+            break;
+        case ElementKind::Fitting:
+            family = &fittings;
+            break;
+        case ElementKind::FittingSupply:
+            family = &fittingSupplies;
+            break;
         }
         const std::size_t slot = family->Slot(element.model);
         family->lengths[slot] += element.length3d;

@@ -24,7 +24,7 @@ inline const std::vector<double> kDepthBounds = {0.0, 1.30, 2.00, 3.50};
 
 // One quantity of a project; counts go to the record as 32-bit integers, the rest as reals.
 struct Quantity {
-    std::string key;  // with its double quotes
+    std::string key; // with its double quotes
     double value = 0;
     bool count = false;
 };
@@ -49,8 +49,8 @@ struct RecordReport {
         std::size_t fittings = 0;
     };
     std::vector<Written> written;
-    std::vector<std::string> removed;  // records of projects no longer in the drawing
-    std::string error;                  // French, when the drawing refused a change
+    std::vector<std::string> removed; // records of projects no longer in the drawing
+    std::string error;                // French, when the drawing refused a change
 };
 
 // Writes (or replaces) the record of every project of the networks and removes the

@@ -15,8 +15,7 @@ AcDbDatabase::AcDbDatabase() : file_(DrawingFile::New()) {}
 
 AcDbDatabase::AcDbDatabase(std::unique_ptr<DrawingFile> file, std::string fileName)
     : file_(std::move(file)), fileName_(std::move(fileName))
-{
-}
+{}
 
 AcDbDatabase::~AcDbDatabase() = default;
 
@@ -86,8 +85,8 @@ Acad::ErrorStatus AcDbDatabase::setHeaderSettings(const VelHeaderSettings& wante
     if (status != Acad::eOk)
         return status;
     bool changed = false;
-    velWalkHeaderVars([&](const VelHeaderVar&, const auto& a, const auto& b) { changed = changed || a != b; },
-                      checked, file_->settings());
+    velWalkHeaderVars([&](const VelHeaderVar&, const auto& a, const auto& b) { changed = changed || a != b; }, checked,
+                      file_->settings());
     if (changed) {
         file_->settings() = std::move(checked);
         modified_ = true;
@@ -106,33 +105,79 @@ Acad::ErrorStatus SetOne(AcDbDatabase& db, T VelHeaderSettings::*member, T value
     return db.setHeaderSettings(settings);
 }
 
-}  // namespace
+} // namespace
 
-short AcDbDatabase::aunits() const { return static_cast<short>(file_->settings().aunits); }
-Acad::ErrorStatus AcDbDatabase::setAunits(short value) { return SetOne(*this, &VelHeaderSettings::aunits, int(value)); }
-double AcDbDatabase::angbase() const { return file_->settings().angbase; }
-Acad::ErrorStatus AcDbDatabase::setAngbase(double value) { return SetOne(*this, &VelHeaderSettings::angbase, value); }
-bool AcDbDatabase::angdir() const { return file_->settings().angdir; }
-Acad::ErrorStatus AcDbDatabase::setAngdir(bool value) { return SetOne(*this, &VelHeaderSettings::angdir, value); }
-int AcDbDatabase::osmode() const { return file_->settings().osmode; }
-Acad::ErrorStatus AcDbDatabase::setOsmode(int value) { return SetOne(*this, &VelHeaderSettings::osmode, value); }
+short AcDbDatabase::aunits() const
+{
+    return static_cast<short>(file_->settings().aunits);
+}
+Acad::ErrorStatus AcDbDatabase::setAunits(short value)
+{
+    return SetOne(*this, &VelHeaderSettings::aunits, int(value));
+}
+double AcDbDatabase::angbase() const
+{
+    return file_->settings().angbase;
+}
+Acad::ErrorStatus AcDbDatabase::setAngbase(double value)
+{
+    return SetOne(*this, &VelHeaderSettings::angbase, value);
+}
+bool AcDbDatabase::angdir() const
+{
+    return file_->settings().angdir;
+}
+Acad::ErrorStatus AcDbDatabase::setAngdir(bool value)
+{
+    return SetOne(*this, &VelHeaderSettings::angdir, value);
+}
+int AcDbDatabase::osmode() const
+{
+    return file_->settings().osmode;
+}
+Acad::ErrorStatus AcDbDatabase::setOsmode(int value)
+{
+    return SetOne(*this, &VelHeaderSettings::osmode, value);
+}
 AcCmColor AcDbDatabase::cecolor() const
 {
     AcCmColor color;
-    color.setColorIndex(static_cast<short>(file_->settings().cecolor > 256 ? AcCmColor::kByLayer : file_->settings().cecolor));
+    color.setColorIndex(
+        static_cast<short>(file_->settings().cecolor > 256 ? AcCmColor::kByLayer : file_->settings().cecolor));
     return color;
 }
 Acad::ErrorStatus AcDbDatabase::setCecolor(const AcCmColor& value)
 {
     return SetOne(*this, &VelHeaderSettings::cecolor, int(value.colorIndex()));
 }
-bool AcDbDatabase::attdia() const { return file_->settings().attdia; }
-Acad::ErrorStatus AcDbDatabase::setAttdia(bool value) { return SetOne(*this, &VelHeaderSettings::attdia, value); }
-bool AcDbDatabase::attreq() const { return file_->settings().attreq; }
-Acad::ErrorStatus AcDbDatabase::setAttreq(bool value) { return SetOne(*this, &VelHeaderSettings::attreq, value); }
-bool AcDbDatabase::limcheck() const { return file_->settings().limcheck; }
-Acad::ErrorStatus AcDbDatabase::setLimcheck(bool value) { return SetOne(*this, &VelHeaderSettings::limcheck, value); }
-bool AcDbDatabase::orthomode() const { return file_->settings().orthomode; }
+bool AcDbDatabase::attdia() const
+{
+    return file_->settings().attdia;
+}
+Acad::ErrorStatus AcDbDatabase::setAttdia(bool value)
+{
+    return SetOne(*this, &VelHeaderSettings::attdia, value);
+}
+bool AcDbDatabase::attreq() const
+{
+    return file_->settings().attreq;
+}
+Acad::ErrorStatus AcDbDatabase::setAttreq(bool value)
+{
+    return SetOne(*this, &VelHeaderSettings::attreq, value);
+}
+bool AcDbDatabase::limcheck() const
+{
+    return file_->settings().limcheck;
+}
+Acad::ErrorStatus AcDbDatabase::setLimcheck(bool value)
+{
+    return SetOne(*this, &VelHeaderSettings::limcheck, value);
+}
+bool AcDbDatabase::orthomode() const
+{
+    return file_->settings().orthomode;
+}
 Acad::ErrorStatus AcDbDatabase::setOrthomode(bool value)
 {
     return SetOne(*this, &VelHeaderSettings::orthomode, value);
@@ -152,7 +197,8 @@ Acad::ErrorStatus AcDbDatabase::setClayer(AcDbObjectId layerId)
     if (layerId.database() != this)
         return Acad::eInvalidInput;
     const std::size_t record = file_->FindRecord(layerId.handle());
-    if (std::find(file_->records().layers().begin(), file_->records().layers().end(), record) == file_->records().layers().end())
+    if (std::find(file_->records().layers().begin(), file_->records().layers().end(), record) ==
+        file_->records().layers().end())
         return Acad::eNotThatKindOfClass;
     return SetOne(*this, &VelHeaderSettings::clayer, file_->RecordName(record));
 }
@@ -172,7 +218,8 @@ std::string AcDbDatabase::layerName(AcDbObjectId layerId) const
     if (layerId.database() != this)
         return std::string();
     const std::size_t record = file_->FindRecord(layerId.handle());
-    if (std::find(file_->records().layers().begin(), file_->records().layers().end(), record) == file_->records().layers().end())
+    if (std::find(file_->records().layers().begin(), file_->records().layers().end(), record) ==
+        file_->records().layers().end())
         return std::string();
     return file_->RecordName(record);
 }
@@ -267,9 +314,18 @@ Acad::ErrorStatus AcDbDatabase::addRegApp(const std::string& name)
     return Acad::eOk;
 }
 
-std::string AcDbDatabase::dxfVersion() const { return file_->acadver(); }
-const std::string& AcDbDatabase::fileName() const { return fileName_; }
-bool AcDbDatabase::isModified() const { return modified_; }
+std::string AcDbDatabase::dxfVersion() const
+{
+    return file_->acadver();
+}
+const std::string& AcDbDatabase::fileName() const
+{
+    return fileName_;
+}
+bool AcDbDatabase::isModified() const
+{
+    return modified_;
+}
 std::size_t AcDbDatabase::objectCount() const
 {
     std::size_t n = 0;

@@ -70,7 +70,8 @@ Acad::ErrorStatus AcDbDictionary::setAt(const std::string& key, AcDbObject* newV
         return es;
     ObjectBody& b = body();
     const int code = b.entries.empty() ? (b.hardOwner ? 360 : 350) : b.entries.back().code;
-    b.entries.push_back({key, b.keep(vel::dxf::EncodeText(key, velEncodingOf(*this))), newValue->body().handle, code, 0});
+    b.entries.push_back(
+        {key, b.keep(vel::dxf::EncodeText(key, velEncodingOf(*this))), newValue->body().handle, code, 0});
     b.dirty = true;
     velRegisterApps(database(), newValue->xDataApplications());
     id = newValue->objectId();
@@ -108,9 +109,8 @@ AcDbDictionaryIterator* AcDbDictionary::newIterator(AcRx::DictIterType type) con
     for (const auto& e : body().entries)
         entries.push_back({e.key, AcDbObjectId(database(), e.handle)});
     if (type == AcRx::kDictSorted)
-        std::stable_sort(entries.begin(), entries.end(), [](const auto& a, const auto& b) {
-            return CompareNoCase(a.key, b.key) < 0;
-        });
+        std::stable_sort(entries.begin(), entries.end(),
+                         [](const auto& a, const auto& b) { return CompareNoCase(a.key, b.key) < 0; });
     return new AcDbDictionaryIterator(std::move(entries));
 }
 

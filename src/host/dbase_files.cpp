@@ -23,7 +23,7 @@ VelReadResult ReadFrom(std::unique_ptr<vel::dxf::Source> source, const std::stri
     return result;
 }
 
-}  // namespace
+} // namespace
 
 VelReadResult velOpenDrawing(const std::string& path, std::unique_ptr<AcDbDatabase>& out)
 {

@@ -16,24 +16,42 @@ const AcDbObjectId AcDbObjectId::kNull;
 const char* acadErrorStatusText(Acad::ErrorStatus status)
 {
     switch (status) {
-    case Acad::eOk: return "eOk";
-    case Acad::eNotImplementedYet: return "eNotImplementedYet";
-    case Acad::eInvalidInput: return "eInvalidInput";
-    case Acad::eNullObjectId: return "eNullObjectId";
-    case Acad::eNullObjectPointer: return "eNullObjectPointer";
-    case Acad::eKeyNotFound: return "eKeyNotFound";
-    case Acad::eDuplicateKey: return "eDuplicateKey";
-    case Acad::eInvalidKey: return "eInvalidKey";
-    case Acad::eUnknownHandle: return "eUnknownHandle";
-    case Acad::eNotThatKindOfClass: return "eNotThatKindOfClass";
-    case Acad::eWasOpenedForRead: return "eWasOpenedForRead";
-    case Acad::eWasOpenedForWrite: return "eWasOpenedForWrite";
-    case Acad::eNotOpenForWrite: return "eNotOpenForWrite";
-    case Acad::eNotOpenForRead: return "eNotOpenForRead";
-    case Acad::eAlreadyInDb: return "eAlreadyInDb";
-    case Acad::eBadDxfSequence: return "eBadDxfSequence";
-    case Acad::eRegappIdNotFound: return "eRegappIdNotFound";
-    case Acad::eNotApplicable: return "eNotApplicable";
+    case Acad::eOk:
+        return "eOk";
+    case Acad::eNotImplementedYet:
+        return "eNotImplementedYet";
+    case Acad::eInvalidInput:
+        return "eInvalidInput";
+    case Acad::eNullObjectId:
+        return "eNullObjectId";
+    case Acad::eNullObjectPointer:
+        return "eNullObjectPointer";
+    case Acad::eKeyNotFound:
+        return "eKeyNotFound";
+    case Acad::eDuplicateKey:
+        return "eDuplicateKey";
+    case Acad::eInvalidKey:
+        return "eInvalidKey";
+    case Acad::eUnknownHandle:
+        return "eUnknownHandle";
+    case Acad::eNotThatKindOfClass:
+        return "eNotThatKindOfClass";
+    case Acad::eWasOpenedForRead:
+        return "eWasOpenedForRead";
+    case Acad::eWasOpenedForWrite:
+        return "eWasOpenedForWrite";
+    case Acad::eNotOpenForWrite:
+        return "eNotOpenForWrite";
+    case Acad::eNotOpenForRead:
+        return "eNotOpenForRead";
+    case Acad::eAlreadyInDb:
+        return "eAlreadyInDb";
+    case Acad::eBadDxfSequence:
+        return "eBadDxfSequence";
+    case Acad::eRegappIdNotFound:
+        return "eRegappIdNotFound";
+    case Acad::eNotApplicable:
+        return "eNotApplicable";
     }
     return "?";
 }
@@ -51,7 +69,7 @@ namespace {
 // New objects outside a database hold UTF-8.
 const TextEncoding kUtf8;
 
-}  // namespace
+} // namespace
 
 const TextEncoding& velEncodingOf(const AcDbObject& object)
 {

@@ -13,7 +13,7 @@ char* CopyText(std::string_view text)
     return s;
 }
 
-}  // namespace
+} // namespace
 
 VelRbKind velRbKind(int restype)
 {

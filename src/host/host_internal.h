@@ -14,11 +14,11 @@ void* velCurrentApp();
 
 // Marks a module as running for the scope (commands, entry point calls).
 class VelAppScope {
- public:
-  explicit VelAppScope(void* appId);
-  ~VelAppScope();
-  VelAppScope(const VelAppScope&) = delete;
-  VelAppScope& operator=(const VelAppScope&) = delete;
+public:
+    explicit VelAppScope(void* appId);
+    ~VelAppScope();
+    VelAppScope(const VelAppScope&) = delete;
+    VelAppScope& operator=(const VelAppScope&) = delete;
 };
 
 // True while the module is loaded (its code may be called).
@@ -55,9 +55,8 @@ bool velIniSetValue(std::string& content, const char* section, const char* key, 
 // The registry file's text apart from the file: its keys with their values, read (a
 // refusal names the file and the line) and written back.
 struct VelRegistryKey {
-  std::string path;  // ROOT\a\b, as first written
-  std::vector<std::pair<std::string, std::string>> values;
+    std::string path; // ROOT\a\b, as first written
+    std::vector<std::pair<std::string, std::string>> values;
 };
-VelReadResult velParseRegistry(const std::string& text, const std::string& fileName,
-                               std::vector<VelRegistryKey>& keys);
+VelReadResult velParseRegistry(const std::string& text, const std::string& fileName, std::vector<VelRegistryKey>& keys);
 std::string velSerializeRegistry(const std::vector<VelRegistryKey>& keys);

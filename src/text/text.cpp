@@ -43,11 +43,17 @@ char32_t NextCodePoint(std::string_view text, std::size_t& i)
     char32_t cp = 0;
     char32_t min = 0;
     if ((b0 & 0xE0) == 0xC0) {
-        len = 2; cp = b0 & 0x1F; min = 0x80;
+        len = 2;
+        cp = b0 & 0x1F;
+        min = 0x80;
     } else if ((b0 & 0xF0) == 0xE0) {
-        len = 3; cp = b0 & 0x0F; min = 0x800;
+        len = 3;
+        cp = b0 & 0x0F;
+        min = 0x800;
     } else if ((b0 & 0xF8) == 0xF0) {
-        len = 4; cp = b0 & 0x07; min = 0x10000;
+        len = 4;
+        cp = b0 & 0x07;
+        min = 0x10000;
     }
     if (len == 0 || i + len > text.size()) {
         ++i;
@@ -76,11 +82,16 @@ char32_t FoldCodePoint(char32_t c)
     if (c >= 0xC0 && c <= 0xDE && c != 0xD7)
         return c + 0x20;
     switch (c) {
-    case 0x0152: return 0x0153; // Œ
-    case 0x0160: return 0x0161; // Š
-    case 0x017D: return 0x017E; // Ž
-    case 0x0178: return 0x00FF; // Ÿ
-    default: return c;
+    case 0x0152:
+        return 0x0153; // Œ
+    case 0x0160:
+        return 0x0161; // Š
+    case 0x017D:
+        return 0x017E; // Ž
+    case 0x0178:
+        return 0x00FF; // Ÿ
+    default:
+        return c;
     }
 }
 
@@ -167,9 +178,9 @@ std::string FormatPattern(std::string_view pattern, const std::vector<PatternArg
             long long v = 0;
             if (argIndex < args.size()) {
                 const PatternArg& a = args[argIndex];
-                v = a.kind == PatternArg::Kind::Int ? a.integer
-                  : a.kind == PatternArg::Kind::Real ? static_cast<long long>(a.real)
-                                                     : ParseInt(a.text).value_or(0);
+                v = a.kind == PatternArg::Kind::Int    ? a.integer
+                    : a.kind == PatternArg::Kind::Real ? static_cast<long long>(a.real)
+                                                       : ParseInt(a.text).value_or(0);
             }
             ++argIndex;
             conversion += std::to_string(std::clamp<long long>(v, 0, limit));
@@ -211,25 +222,25 @@ std::string FormatPattern(std::string_view pattern, const std::vector<PatternArg
         if (conv == 's') {
             std::string text;
             if (arg != nullptr)
-                text = arg->kind == PatternArg::Kind::Text ? arg->text
-                     : arg->kind == PatternArg::Kind::Real ? FormatRealShortest(arg->real)
-                                                           : std::to_string(arg->integer);
+                text = arg->kind == PatternArg::Kind::Text   ? arg->text
+                       : arg->kind == PatternArg::Kind::Real ? FormatRealShortest(arg->real)
+                                                             : std::to_string(arg->integer);
             out += FormatString(conversion.c_str(), text.c_str());
         } else if (conv == 'd' || conv == 'i' || conv == 'x') {
             long long v = 0;
             if (arg != nullptr)
-                v = arg->kind == PatternArg::Kind::Int ? arg->integer
-                  : arg->kind == PatternArg::Kind::Real ? static_cast<long long>(arg->real)
-                                                        : ParseInt(arg->text).value_or(0);
+                v = arg->kind == PatternArg::Kind::Int    ? arg->integer
+                    : arg->kind == PatternArg::Kind::Real ? static_cast<long long>(arg->real)
+                                                          : ParseInt(arg->text).value_or(0);
             std::string llspec = conversion;
             llspec.insert(llspec.size() - 1, "ll");
             out += FormatString(llspec.c_str(), v);
         } else {
             double v = 0;
             if (arg != nullptr)
-                v = arg->kind == PatternArg::Kind::Real ? arg->real
-                  : arg->kind == PatternArg::Kind::Int ? static_cast<double>(arg->integer)
-                                                       : ParseReal(arg->text).value_or(0.0);
+                v = arg->kind == PatternArg::Kind::Real  ? arg->real
+                    : arg->kind == PatternArg::Kind::Int ? static_cast<double>(arg->integer)
+                                                         : ParseReal(arg->text).value_or(0.0);
             out += FormatString(conversion.c_str(), v);
         }
         i = j + 1;
@@ -385,4 +396,3 @@ std::string EncodeUtf8(std::u32string_view text)
         AppendUtf8(out, c > 0x10FFFF || (c >= 0xD800 && c <= 0xDFFF) ? U'\uFFFD' : c);
     return out;
 }
-

@@ -29,8 +29,16 @@ TEST(DecodeText, ConvertsCodePageBytesAndEscapes)
         const TextEncoding& encoding;
         std::string_view text;
     } cases[] = {
-        {"1252 letters", "D\xE9" "blai \x80 \x96", cp1252, "Déblai € –"},
-        {"1252 undefined byte", "a\x81" "b", cp1252, "a\xEF\xBF\xBD" "b"},
+        {"1252 letters",
+         "D\xE9"
+         "blai \x80 \x96",
+         cp1252, "Déblai € –"},
+        {"1252 undefined byte",
+         "a\x81"
+         "b",
+         cp1252,
+         "a\xEF\xBF\xBD"
+         "b"},
         {"upper-case escape", "\\U+03A9", cp1252, "Ω"},
         {"lower-case escape", "x\\u+03a9y", cp1252, "xΩy"},
         {"escape in UTF-8 file", "\\U+00E9 é", utf8, "é é"},
@@ -49,12 +57,13 @@ TEST(EncodeText, EscapesWhatTheCodePageCannotHold)
 {
     const TextEncoding cp1252 = TextEncoding::For("AC1018", "ANSI_1252");
     const TextEncoding cp1251 = TextEncoding::For("AC1015", "ANSI_1251");
-    EXPECT_EQ(EncodeText("Déblai € ΩΣ 😀", cp1252), "D\xE9" "blai \x80 \\U+03A9\\U+03A3 \\U+D83D\\U+DE00");
+    EXPECT_EQ(EncodeText("Déblai € ΩΣ 😀", cp1252), "D\xE9"
+                                                   "blai \x80 \\U+03A9\\U+03A3 \\U+D83D\\U+DE00");
     EXPECT_EQ(EncodeText("Да é", cp1251), "\xC4\xE0 \\U+00E9");
     EXPECT_EQ(EncodeText("Déblai ΩΣ", TextEncoding::For("AC1032", "")), "Déblai ΩΣ");
     const std::string text = "Réseau Été — 5 €, Ω";
     EXPECT_EQ(DecodeText(EncodeText(text, cp1252), cp1252), text);
 }
 
-}  // namespace
-}  // namespace vel::dxf
+} // namespace
+} // namespace vel::dxf

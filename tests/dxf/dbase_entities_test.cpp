@@ -29,7 +29,7 @@ const std::string kDrawing =
     "  0\nPOINT\n 67\n1\n 10\n5\n 20\n5\n"
     "  0\nENDSEC\n  0\nEOF\n";
 
-}  // namespace
+} // namespace
 
 TEST(VelReadEntities, WalksEntitiesInFileOrder)
 {
@@ -71,7 +71,7 @@ TEST(VelReadEntities, WalksEntitiesInFileOrder)
     const VelEntity& point = entities[3];
     EXPECT_TRUE(point.paperSpace);
     EXPECT_EQ(point.layer, "0");
-    EXPECT_NE(point.handle, 0u);  // a handle-less R12 entity still gets one, so that it opens
+    EXPECT_NE(point.handle, 0u); // a handle-less R12 entity still gets one, so that it opens
     EXPECT_FALSE(VelRbPtr(point.xData(nullptr)));
 }
 

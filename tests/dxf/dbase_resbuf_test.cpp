@@ -11,14 +11,14 @@ TEST(Resbuf, KindOfEachTypeCode)
         int code;
         VelRbKind kind;
     } cases[] = {
-        {RTSHORT, VelRbKind::Short}, {RTSTR, VelRbKind::String}, {RTREAL, VelRbKind::Real},
-        {RT3DPOINT, VelRbKind::Point}, {RTLONG, VelRbKind::Long}, {RTNONE, VelRbKind::None},
-        {1000, VelRbKind::String}, {1001, VelRbKind::String}, {1002, VelRbKind::String},
-        {1004, VelRbKind::Binary}, {1005, VelRbKind::String}, {1010, VelRbKind::Point},
-        {1013, VelRbKind::Point}, {1040, VelRbKind::Real}, {1042, VelRbKind::Real},
-        {1070, VelRbKind::Short}, {1071, VelRbKind::Long}, {1, VelRbKind::String},
-        {10, VelRbKind::Point}, {40, VelRbKind::Real}, {70, VelRbKind::Short}, {90, VelRbKind::Long},
-        {330, VelRbKind::String},
+        {RTSHORT, VelRbKind::Short},   {RTSTR, VelRbKind::String}, {RTREAL, VelRbKind::Real},
+        {RT3DPOINT, VelRbKind::Point}, {RTLONG, VelRbKind::Long},  {RTNONE, VelRbKind::None},
+        {1000, VelRbKind::String},     {1001, VelRbKind::String},  {1002, VelRbKind::String},
+        {1004, VelRbKind::Binary},     {1005, VelRbKind::String},  {1010, VelRbKind::Point},
+        {1013, VelRbKind::Point},      {1040, VelRbKind::Real},    {1042, VelRbKind::Real},
+        {1070, VelRbKind::Short},      {1071, VelRbKind::Long},    {1, VelRbKind::String},
+        {10, VelRbKind::Point},        {40, VelRbKind::Real},      {70, VelRbKind::Short},
+        {90, VelRbKind::Long},         {330, VelRbKind::String},
     };
     for (const auto& c : cases) {
         SCOPED_TRACE(c.code);
@@ -42,4 +42,4 @@ TEST(Resbuf, DuplicateIsDeepAndReleaseFreesEverything)
     EXPECT_EQ(velRbText(nullptr), "");
 }
 
-}  // namespace
+} // namespace

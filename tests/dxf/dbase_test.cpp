@@ -174,9 +174,9 @@ std::map<std::string, std::map<std::string, double>> Projects(AcDbDatabase& db, 
                 for (rb = rb->rbnext->rbnext; rb && rb->restype == 1000 && rb->rbnext; rb = rb->rbnext->rbnext) {
                     const resbuf* q = rb->rbnext;
                     table[velRbText(rb)] = q->restype == 1040 || q->restype == 1041 ? q->resval.rreal
-                                           : q->restype == 1070                   ? q->resval.rint
-                                           : q->restype == 1071                   ? q->resval.rlong
-                                                                                  : std::stod(velRbText(q));
+                                           : q->restype == 1070                     ? q->resval.rint
+                                           : q->restype == 1071                     ? q->resval.rlong
+                                                                                    : std::stod(velRbText(q));
                 }
             }
             b->close();
@@ -279,4 +279,4 @@ TEST(AcDbXrecord, DataRoundTripsThroughTheDrawing)
     again->close();
 }
 
-}  // namespace
+} // namespace

@@ -57,12 +57,9 @@ TEST(Drawing, FixturesReadAndWriteBackByteForByte)
         const char* clayer;
         std::size_t layers;
     } cases[] = {
-        {"r12.dxf", "AC1009", 33, "0", 3},
-        {"r2000.dxf", "AC1015", 37, "RESEAU_EP", 3},
-        {"r2004_1252.dxf", "AC1018", 37, "0", 4},
-        {"r2018.dxf", "AC1032", 37, "0", 3},
-        {"crlf.dxf", "AC1032", 37, "0", 3},
-        {"r2018_bin.dxf", "AC1032", 37, "0", 3},
+        {"r12.dxf", "AC1009", 33, "0", 3},        {"r2000.dxf", "AC1015", 37, "RESEAU_EP", 3},
+        {"r2004_1252.dxf", "AC1018", 37, "0", 4}, {"r2018.dxf", "AC1032", 37, "0", 3},
+        {"crlf.dxf", "AC1032", 37, "0", 3},       {"r2018_bin.dxf", "AC1032", 37, "0", 3},
         {"r12_bin.dxf", "AC1009", 20583, "0", 3},
     };
     for (const auto& c : cases) {
@@ -213,7 +210,8 @@ std::string Replace(std::string text, std::string_view what, std::string_view wi
 std::uint32_t LineOf(const std::string& text, std::string_view marker)
 {
     const auto at = text.find(marker);
-    return 1 + static_cast<std::uint32_t>(std::count(text.begin(), text.begin() + static_cast<std::ptrdiff_t>(at), '\n'));
+    return 1 +
+           static_cast<std::uint32_t>(std::count(text.begin(), text.begin() + static_cast<std::ptrdiff_t>(at), '\n'));
 }
 
 TEST(Drawing, MalformedFilesAreRefusedWithFileLineAndExpectation)
@@ -226,7 +224,7 @@ TEST(Drawing, MalformedFilesAreRefusedWithFileLineAndExpectation)
     struct Case {
         const char* name;
         std::string text;
-        std::string marker;  // the line the message names starts with this (after the replacement)
+        std::string marker; // the line the message names starts with this (after the replacement)
         int lineShift;
         std::string expected;
     };
@@ -239,22 +237,22 @@ TEST(Drawing, MalformedFilesAreRefusedWithFileLineAndExpectation)
         {"dangling dictionary entry", Replace(sound, "350\nD\n", "350\n99\n"), "350\n99", 0,
          "une entrée vers un objet du dessin (l'identifiant 99 de « A » n'existe pas)"},
         {"entry to a handle only given in memory",
-         Replace(Replace(Replace(Replace(sound, "$HANDSEED\n  5\nFF", "$HANDSEED\n  5\nE"), "  5\nE\n330\nD\n",
-                                         "330\nD\n"),
-                         "  5\n10\n330\n2\n", "  5\n4\n330\n2\n"),
-                 "  5\n20\n", "  5\n5\n"),
+         Replace(
+             Replace(Replace(Replace(sound, "$HANDSEED\n  5\nFF", "$HANDSEED\n  5\nE"), "  5\nE\n330\nD\n", "330\nD\n"),
+                     "  5\n10\n330\n2\n", "  5\n4\n330\n2\n"),
+             "  5\n20\n", "  5\n5\n"),
          "360\nE", 0, "une entrée vers un objet du dessin (l'identifiant E de « B » n'existe pas)"},
-        {"cyclic dictionaries", Replace(sound, "100\nAcDbDictionary\n  0\nENDSEC",
-                                        "100\nAcDbDictionary\n  3\nX\n350\nC\n  0\nENDSEC"),
+        {"cyclic dictionaries",
+         Replace(sound, "100\nAcDbDictionary\n  0\nENDSEC", "100\nAcDbDictionary\n  3\nX\n350\nC\n  0\nENDSEC"),
          "350\nC\n  0\nENDSEC", 0,
          "une entrée qui ne remonte pas à un dictionnaire parent (« X » ramène au dictionnaire de la ligne 65)"},
         {"duplicate handle", Replace(sound, "  5\n20\n", "  5\n10\n"), "  0\nLINE", 0,
          "un identifiant unique (10 est déjà celui de la ligne 27)"},
         {"invalid UTF-8 text", Replace(sound, "texte", "t\xE9xte"), "t\xE9xte", 0, "un texte UTF-8 valide"},
         {"malformed XData", Replace(sound, "1000\ntexte\n", "1070\ntexte\n"), "1070", 0, "un entier de 16 bits"},
-        {"entity outside a section", Replace(sound, "  0\nSECTION\n  2\nENTITIES\n", ""), "  0\nLINE", 0,
-         "0 SECTION"},
-        {"section without name", Replace(sound, "  2\nENTITIES\n", ""), "  0\nLINE", 0, "le nom de la section (code 2)"},
+        {"entity outside a section", Replace(sound, "  0\nSECTION\n  2\nENTITIES\n", ""), "  0\nLINE", 0, "0 SECTION"},
+        {"section without name", Replace(sound, "  2\nENTITIES\n", ""), "  0\nLINE", 0,
+         "le nom de la section (code 2)"},
         {"missing ENDSEC", Replace(sound, "  0\nENDSEC\n  0\nSECTION\n  2\nOBJECTS", "  0\nSECTION\n  2\nOBJECTS"),
          "  0\nSECTION\n  2\nOBJECTS", 0, "0 ENDSEC avant la section suivante"},
         {"header value that is no number", Replace(sound, "$HANDSEED\n  5\nFF", "$OSMODE\n 70\nbeaucoup"), "beaucoup",
@@ -295,7 +293,7 @@ TEST(Drawing, ASeedLeftTooLowIsRaisedOnlyWhenSomethingIsWritten)
     ASSERT_EQ(nod->setAt("NOUVEAU", record, id), Acad::eOk);
     record->close();
     nod->close();
-    EXPECT_EQ(id.handle(), 0x21u);  // above the highest handle, 20
+    EXPECT_EQ(id.handle(), 0x21u); // above the highest handle, 20
     const std::string written = Written(*db);
     EXPECT_NE(written.find("$HANDSEED\n  5\n22\n"), std::string::npos);
 }
@@ -315,13 +313,13 @@ TEST(Drawing, DictionaryEntriesMayNameDictionariesOfAnySection)
 
 TEST(Drawing, DuplicateHandlesFoundHoweverShuffled)
 {
-    for (int count : {3, 70}) {  // few ascending runs are merged, many are sorted
+    for (int count : {3, 70}) { // few ascending runs are merged, many are sorted
         SCOPED_TRACE(count);
         std::string lines;
         for (int k = count; k > 0; --k)
             lines += "  0\nLINE\n  5\n" + FormatHandle(0x100 + static_cast<unsigned>(k)) + "\n  8\n0\n";
-        const std::string sound = Replace(Sound(), "  0\nENDSEC\n  0\nSECTION\n  2\nOBJECTS", lines +
-                                          "  0\nENDSEC\n  0\nSECTION\n  2\nOBJECTS");
+        const std::string sound = Replace(Sound(), "  0\nENDSEC\n  0\nSECTION\n  2\nOBJECTS",
+                                          lines + "  0\nENDSEC\n  0\nSECTION\n  2\nOBJECTS");
         std::unique_ptr<AcDbDatabase> db;
         std::string error;
         ASSERT_EQ(velReadDrawing(sound, "lignes.dxf", db).description(), "");
@@ -448,8 +446,8 @@ TEST(Drawing, SaveThatFailsAnywhereLeavesThePreviousDrawing)
             }
             EXPECT_FALSE(saved);
             EXPECT_EQ(Slurp(path), original);
-            EXPECT_EQ(error.rfind("Fichier « " + path + " » non enregistré : " +
-                                      velFileErrorReason(FileFaults::ErrorOf(run.failed)),
+            EXPECT_EQ(error.rfind("Fichier « " + path +
+                                      " » non enregistré : " + velFileErrorReason(FileFaults::ErrorOf(run.failed)),
                                   0),
                       0u)
                 << error;
@@ -478,4 +476,4 @@ TEST(Drawing, FileCutShortWhileOpenDoesNotReachTheDrawing)
     EXPECT_EQ(back->getLayerId("APRES", layer), Acad::eOk);
 }
 
-}  // namespace
+} // namespace

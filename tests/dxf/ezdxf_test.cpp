@@ -74,7 +74,7 @@ TEST(EzdxfRoundTrip, OnlyWhatTheHostChangedDiffers)
         const char* file;
         bool hasProjects;
         const char* oldOsmode;
-        const char* omega;  // as ezdxf gives it back: it leaves the escapes of XData as they are
+        const char* omega; // as ezdxf gives it back: it leaves the escapes of XData as they are
     } cases[] = {
         {"r12.dxf", false, "33", ""},
         {"r2000.dxf", true, "None", "\\\\U+03A9"},
@@ -104,7 +104,8 @@ TEST(EzdxfRoundTrip, OnlyWhatTheHostChangedDiffers)
             gone.push_back("xdata /VELANTO_RSX_VRD/PROJECTS/P1 DAZUVUVUD [(1000, 'PRJ_NOM'), (1000, 'Réseau EP'), "
                            "(1000, 'EP_LIN'), (1000, '12.5'), (1000, 'EP_BIG'), (1071, 100000)]");
             added.push_back(std::string("xdata /VELANTO_RSX_VRD/PROJECTS/P1 DAZUVUVUD [(1000, 'PRJ_NOM'), "
-                                        "(1000, 'Réseau EP ") + c.omega + "'), (1000, 'EP_LIN'), (1040, 99.25)]");
+                                        "(1000, 'Réseau EP ") +
+                            c.omega + "'), (1000, 'EP_LIN'), (1040, 99.25)]");
         }
         EXPECT_EQ(Minus(before, after), gone);
         EXPECT_EQ(Minus(after, before), added);
@@ -135,4 +136,4 @@ TEST(EzdxfRoundTrip, UnknownEntitiesAndObjectsAreKeptByteForByte)
     std::remove(saved.c_str());
 }
 
-}  // namespace
+} // namespace

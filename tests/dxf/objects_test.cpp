@@ -59,7 +59,8 @@ TEST(ParseObject, RefusesMalformedObjects)
         std::uint32_t line;
         const char* expected;
     } cases[] = {
-        {"entry without object", "0\nDICTIONARY\n5\n1\n3\nK\n1\nx\n", 7, "le code 350 ou 360 de l'entrée de dictionnaire"},
+        {"entry without object", "0\nDICTIONARY\n5\n1\n3\nK\n1\nx\n", 7,
+         "le code 350 ou 360 de l'entrée de dictionnaire"},
         {"entry with a bad handle", "0\nDICTIONARY\n5\n1\n3\nK\n350\nXY\n", 7, "un identifiant hexadécimal"},
         {"handle zero", "0\nLINE\n5\n0\n", 3, "un identifiant hexadécimal non nul"},
         {"XData before its application", "0\nLINE\n5\n1\n1000\nx\n", 5,
@@ -86,17 +87,17 @@ TEST(ParseObject, RefusesMalformedObjects)
 
 TEST(XData, ReadsEveryItemType)
 {
-    const ObjectBody body = Parse(
-        "0\nLINE\n5\n1\n1001\nOTHER\n1000\nno\n1001\nAPP\n1000\n a b \n1002\n{\n1003\n0\n1004\n00FF\n1002\n}\n"
-        "1005\n1F\n1010\n1\n1020\n2\n1030\n3\n1011\n4\n1021\n5\n1040\n1.5\n1041\n2\n1042\n3\n1070\n-7\n"
-        "1071\n2147483647\n");
+    const ObjectBody body =
+        Parse("0\nLINE\n5\n1\n1001\nOTHER\n1000\nno\n1001\nAPP\n1000\n a b \n1002\n{\n1003\n0\n1004\n00FF\n1002\n}\n"
+              "1005\n1F\n1010\n1\n1020\n2\n1030\n3\n1011\n4\n1021\n5\n1040\n1.5\n1041\n2\n1042\n3\n1070\n-7\n"
+              "1071\n2147483647\n");
     VelRbPtr list(XDataToRb(body.xdata, "app", kUtf8));
     ASSERT_TRUE(list);
     std::vector<short> codes;
     for (const resbuf* rb = list.get(); rb; rb = rb->rbnext)
         codes.push_back(rb->restype);
-    EXPECT_EQ(codes, (std::vector<short>{1001, 1000, 1002, 1003, 1004, 1002, 1005, 1010, 1011, 1040, 1041, 1042,
-                                         1070, 1071}));
+    EXPECT_EQ(codes,
+              (std::vector<short>{1001, 1000, 1002, 1003, 1004, 1002, 1005, 1010, 1011, 1040, 1041, 1042, 1070, 1071}));
     const resbuf* rb = list.get();
     EXPECT_EQ(velRbText(rb), "APP");
     EXPECT_EQ(velRbText(rb->rbnext), " a b ");
@@ -107,7 +108,7 @@ TEST(XData, ReadsEveryItemType)
     EXPECT_EQ(point->resval.rpoint[2], 3.0);
     const resbuf* point2 = point->rbnext;
     EXPECT_EQ(point2->resval.rpoint[1], 5.0);
-    EXPECT_EQ(point2->resval.rpoint[2], 0.0);  // Z left out
+    EXPECT_EQ(point2->resval.rpoint[2], 0.0); // Z left out
     const resbuf* last = point2->rbnext->rbnext->rbnext->rbnext->rbnext;
     EXPECT_EQ(last->resval.rlong, 2147483647);
     EXPECT_EQ(XDataApps(body.xdata, kUtf8), (std::vector<std::string>{"OTHER", "APP"}));
@@ -196,5 +197,5 @@ TEST(Xrecord, DataWithAndWithoutCloningFlag)
     }
 }
 
-}  // namespace
-}  // namespace vel::dxf
+} // namespace
+} // namespace vel::dxf

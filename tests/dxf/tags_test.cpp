@@ -12,7 +12,7 @@ struct TagCase {
     const char* name;
     std::string_view input;
     std::vector<std::pair<int, std::string_view>> tags;
-    const char* expected;  // null when the input reads to the end
+    const char* expected; // null when the input reads to the end
     std::uint32_t errorLine;
 };
 
@@ -28,8 +28,16 @@ TEST(TagReader, ReadsPairsAndRefusesMalformedOnes)
         {"negative code", "-1\nx\n", {{-1, "x"}}, nullptr, 0},
         {"non-numeric code", "0\nLINE\nabc\nx\n", {{0, "LINE"}}, "un code de groupe (nombre entier)", 3},
         {"code with trailing text", "8x\n0\n", {}, "un code de groupe (nombre entier)", 1},
-        {"odd pair at the end", "0\nLINE\n8\n", {{0, "LINE"}}, "une valeur après le code de groupe (fichier tronqué)", 4},
-        {"code without line end", "0\nLINE\n8", {{0, "LINE"}}, "une valeur après le code de groupe (fichier tronqué)", 3},
+        {"odd pair at the end",
+         "0\nLINE\n8\n",
+         {{0, "LINE"}},
+         "une valeur après le code de groupe (fichier tronqué)",
+         4},
+        {"code without line end",
+         "0\nLINE\n8",
+         {{0, "LINE"}},
+         "une valeur après le code de groupe (fichier tronqué)",
+         3},
         {"overlong code", "1234567890\nx\n", {}, "un code de groupe (nombre entier)", 1},
     };
     for (const auto& c : cases) {
@@ -65,8 +73,14 @@ TEST(Handles, ParseUpTo64BitsInEitherCase)
         std::string_view text;
         std::optional<std::uint64_t> value;
     } cases[] = {
-        {"1F", 0x1F}, {"1f", 0x1F}, {"FFFFFFFFFFFFFFFF", 0xFFFFFFFFFFFFFFFFULL}, {" A0 ", 0xA0},
-        {"10000000000000000", std::nullopt}, {"", std::nullopt}, {"G1", std::nullopt}, {"-1", std::nullopt},
+        {"1F", 0x1F},
+        {"1f", 0x1F},
+        {"FFFFFFFFFFFFFFFF", 0xFFFFFFFFFFFFFFFFULL},
+        {" A0 ", 0xA0},
+        {"10000000000000000", std::nullopt},
+        {"", std::nullopt},
+        {"G1", std::nullopt},
+        {"-1", std::nullopt},
     };
     for (const auto& c : cases) {
         SCOPED_TRACE(std::string(c.text));
@@ -94,9 +108,9 @@ TEST(Utf8, FindsTheFirstInvalidByte)
         {"é € 日本 😀", std::string_view::npos},
         {"abcdefgh\xE9t\xE9", 8},
         {"\xC3", 0},
-        {"ok\xED\xA0\x80", 2},     // a surrogate
-        {"ok\xC0\xAF", 2},         // overlong
-        {"12345678\xF4\x90\x80\x80", 8},  // above U+10FFFF
+        {"ok\xED\xA0\x80", 2},           // a surrogate
+        {"ok\xC0\xAF", 2},               // overlong
+        {"12345678\xF4\x90\x80\x80", 8}, // above U+10FFFF
     };
     for (const auto& c : cases) {
         SCOPED_TRACE(std::string(c.text));
@@ -105,5 +119,5 @@ TEST(Utf8, FindsTheFirstInvalidByte)
     EXPECT_EQ(LineOfOffset("a\nb\nc", 4), 3u);
 }
 
-}  // namespace
-}  // namespace vel::dxf
+} // namespace
+} // namespace vel::dxf

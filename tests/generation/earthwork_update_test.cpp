@@ -37,8 +37,8 @@ TEST(UpdateStripping, OneVolumeAndOneSurfacePerThickness)
     EXPECT_EQ(group[0]->unit, "m³");
     EXPECT_EQ(group[2]->unit, "m²");
     EXPECT_EQ(group[0]->designation, "Volume de décapage sur une épaisseur de 0.20 m");
-    EXPECT_EQ(group[0]->treePath, R"(Voirie\\Terrassements\\Terre végétale\\Décapage\\Volumique\\GC-001 - )" +
-                                      group[0]->designation);
+    EXPECT_EQ(group[0]->treePath,
+              R"(Voirie\\Terrassements\\Terre végétale\\Décapage\\Volumique\\GC-001 - )" + group[0]->designation);
     EXPECT_FALSE(UpdateStripping(bdr, {0.20, 0.30}));
 }
 
@@ -68,9 +68,9 @@ TEST(EarthworkPurge, SparesTheOtherFamiliesOfTheRoadGroup)
     // An empty list removes the family's articles that the length test admits:
     // PRJ_VOL_TOT_DEC_12.500 is longer than the sample PRJ_VOL_TOT_DEC_0.000.
     EXPECT_TRUE(UpdateStripping(bdr, {}));
-    EXPECT_EQ(RoadKeys(bdr), (Names{"PRJ_VOL_MAT_Grave", "PRJ_TON_MAT_Grave", "PRJ_VOL_RPF_Grave",
-                                    "PRJ_VOL_TOT_DEC_12.500", "PRJ_SFC_DEC_3D_12.500", "PRJ_VOL_TOT_VEG_0.250",
-                                    "PRJ_SFC_TOT_VEG_0.250"}));
+    EXPECT_EQ(RoadKeys(bdr),
+              (Names{"PRJ_VOL_MAT_Grave", "PRJ_TON_MAT_Grave", "PRJ_VOL_RPF_Grave", "PRJ_VOL_TOT_DEC_12.500",
+                     "PRJ_SFC_DEC_3D_12.500", "PRJ_VOL_TOT_VEG_0.250", "PRJ_SFC_TOT_VEG_0.250"}));
     EXPECT_FALSE(UpdatePlaning(bdr, {}));
 }
 

@@ -22,8 +22,8 @@ struct PurgeFlag {
     ~PurgeFlag() { SetPurgeFlag(false); }
 };
 
-bool Update(CZodEVIBdr& bdr, int index, const std::string& name, const Names& models = {},
-            const Names& materials = {}, const Bounds& bounds = {}, const Names& fittings = {})
+bool Update(CZodEVIBdr& bdr, int index, const std::string& name, const Names& models = {}, const Names& materials = {},
+            const Bounds& bounds = {}, const Names& fittings = {})
 {
     return UpdateNetwork(bdr, index, name, models, {}, fittings, {}, {}, materials, bounds);
 }
@@ -58,24 +58,40 @@ TEST(UpdateNetwork, FirstUpdateMakesTheFixedArticlesInOrder)
     const Expected expected[] = {
         {"TP-001", "", "", R"(EU 1\\Travaux préparatoires\\Non Graphique\\TP-001 - Installation du chantier)"},
         {"TP-002", "", "", R"(EU 1\\Travaux préparatoires\\Non Graphique\\TP-002 - Piquetage, implantation, sondage)"},
-        {"EU-001", "RSX_LIN_TOT_3D", "ml", R"(EU 1\\Canalisation EU\\Linéaire\\EU-001 - Longueur 3D des canalisations)"},
+        {"EU-001", "RSX_LIN_TOT_3D", "ml",
+         R"(EU 1\\Canalisation EU\\Linéaire\\EU-001 - Longueur 3D des canalisations)"},
         {"EU-002", "RSX_BRA_LIN_3D", "ml", R"(EU 1\\Canalisation EU\\Linéaire\\EU-002 - Longueur 3D des branchements)"},
         {"EU-003", "RSX_BRA_BX_NB", "", R"(EU 1\\Branchements\\Ponctuel\\EU-003 - Boîtes clients)"},
-        {"GC-001", "RSX_LIN_FDT_2D", "ml", R"(EU 1\\Travaux de génie civil\\Traitement du sol de fondation\\Linéaire\\GC-001 - Longueur 2D)"},
-        {"GC-002", "RSX_LIN_FDT_3D", "ml", R"(EU 1\\Travaux de génie civil\\Traitement du sol de fondation\\Linéaire\\GC-002 - Longueur 3D)"},
-        {"GC-003", "RSX_LIN_DEC_2D", "ml", R"(EU 1\\Travaux de génie civil\\Démolition de chausée\\Linéaire\\GC-003 - Longueur 2D de découpage)"},
-        {"GC-004", "RSX_LIN_DEC_3D", "ml", R"(EU 1\\Travaux de génie civil\\Démolition de chausée\\Linéaire\\GC-004 - Longueur 3D de découpage)"},
-        {"GC-005", "RSX_LIN_BLI_2D", "ml", R"(EU 1\\Travaux de génie civil\\Terrassements\\Protection contre les éboulements\\Linéaire\\GC-005 - Longueur 2D blindée)"},
-        {"GC-006", "RSX_SFC_DEC", "m²", R"(EU 1\\Travaux de génie civil\\Démolition de chausée\\Surfacique\\GC-006 - Surface 2D de démolition)"},
-        {"GC-007", "RSX_SFC_BLI", "m²", R"(EU 1\\Travaux de génie civil\\Terrassements\\Protection contre les éboulements\\Surfacique\\GC-007 - Surface de blindage)"},
-        {"GC-008", "RSX_VOL_FOU", "m³", R"(EU 1\\Travaux de génie civil\\Terrassements\\Tranchées\\Volumique\\GC-008 - Volume de fouille)"},
-        {"GC-009", "RSX_BRA_VOL_FO", "m³", R"(EU 1\\Travaux de génie civil\\Terrassements\\Tranchées des branchements\\Volumique\\GC-009 - Volume de fouille)"},
-        {"GC-010", "RSX_VOL_FDT", "m³", R"(EU 1\\Travaux de génie civil\\Traitement du sol de fondation\\Volumique\\GC-010 - Volume)"},
-        {"GC-011", "RSX_VOL_LPO", "m³", R"(EU 1\\Travaux de génie civil\\Terrassements\\Enrobage et lit de pose\\Volumique\\GC-011 - Volume de lit de pose)"},
-        {"GC-012", "RSX_VOL_EBG", "m³", R"(EU 1\\Travaux de génie civil\\Terrassements\\Enrobage et lit de pose\\Volumique\\GC-012 - Volume d'enrobage)"},
-        {"GC-013", "RSX_VOL_RBL", "m³", R"(EU 1\\Travaux de génie civil\\Terrassements\\Remblais et apports\\Volumique\\GC-013 - Volume de remblai)"},
-        {"GC-014", "RSX_VOL_DEC", "m³", R"(EU 1\\Travaux de génie civil\\Démolition de chausée\\Volumique\\GC-014 - Volume de démolition)"},
-        {"GC-015", "RSX_VOL_BLI", "m³", R"(EU 1\\Travaux de génie civil\\Terrassements\\Protection contre les éboulements\\Volumique\\GC-015 - Volume de blindage)"},
+        {"GC-001", "RSX_LIN_FDT_2D", "ml",
+         R"(EU 1\\Travaux de génie civil\\Traitement du sol de fondation\\Linéaire\\GC-001 - Longueur 2D)"},
+        {"GC-002", "RSX_LIN_FDT_3D", "ml",
+         R"(EU 1\\Travaux de génie civil\\Traitement du sol de fondation\\Linéaire\\GC-002 - Longueur 3D)"},
+        {"GC-003", "RSX_LIN_DEC_2D", "ml",
+         R"(EU 1\\Travaux de génie civil\\Démolition de chausée\\Linéaire\\GC-003 - Longueur 2D de découpage)"},
+        {"GC-004", "RSX_LIN_DEC_3D", "ml",
+         R"(EU 1\\Travaux de génie civil\\Démolition de chausée\\Linéaire\\GC-004 - Longueur 3D de découpage)"},
+        {"GC-005", "RSX_LIN_BLI_2D", "ml",
+         R"(EU 1\\Travaux de génie civil\\Terrassements\\Protection contre les éboulements\\Linéaire\\GC-005 - Longueur 2D blindée)"},
+        {"GC-006", "RSX_SFC_DEC", "m²",
+         R"(EU 1\\Travaux de génie civil\\Démolition de chausée\\Surfacique\\GC-006 - Surface 2D de démolition)"},
+        {"GC-007", "RSX_SFC_BLI", "m²",
+         R"(EU 1\\Travaux de génie civil\\Terrassements\\Protection contre les éboulements\\Surfacique\\GC-007 - Surface de blindage)"},
+        {"GC-008", "RSX_VOL_FOU", "m³",
+         R"(EU 1\\Travaux de génie civil\\Terrassements\\Tranchées\\Volumique\\GC-008 - Volume de fouille)"},
+        {"GC-009", "RSX_BRA_VOL_FO", "m³",
+         R"(EU 1\\Travaux de génie civil\\Terrassements\\Tranchées des branchements\\Volumique\\GC-009 - Volume de fouille)"},
+        {"GC-010", "RSX_VOL_FDT", "m³",
+         R"(EU 1\\Travaux de génie civil\\Traitement du sol de fondation\\Volumique\\GC-010 - Volume)"},
+        {"GC-011", "RSX_VOL_LPO", "m³",
+         R"(EU 1\\Travaux de génie civil\\Terrassements\\Enrobage et lit de pose\\Volumique\\GC-011 - Volume de lit de pose)"},
+        {"GC-012", "RSX_VOL_EBG", "m³",
+         R"(EU 1\\Travaux de génie civil\\Terrassements\\Enrobage et lit de pose\\Volumique\\GC-012 - Volume d'enrobage)"},
+        {"GC-013", "RSX_VOL_RBL", "m³",
+         R"(EU 1\\Travaux de génie civil\\Terrassements\\Remblais et apports\\Volumique\\GC-013 - Volume de remblai)"},
+        {"GC-014", "RSX_VOL_DEC", "m³",
+         R"(EU 1\\Travaux de génie civil\\Démolition de chausée\\Volumique\\GC-014 - Volume de démolition)"},
+        {"GC-015", "RSX_VOL_BLI", "m³",
+         R"(EU 1\\Travaux de génie civil\\Terrassements\\Protection contre les éboulements\\Volumique\\GC-015 - Volume de blindage)"},
     };
     CZodEVIBdr bdr;
     EXPECT_TRUE(Update(bdr, 1, "EU 1"));
@@ -110,8 +126,8 @@ TEST(UpdateNetwork, SecondIdenticalUpdateChangesNothingAndKeepsUserEdits)
         PurgeFlag flag(purge);
         CZodEVIBdr bdr;
         const auto update = [&] {
-            return UpdateNetwork(bdr, 1, "EU 1", {"PVC 200"}, {"Joint"}, {"Regard"}, {"Tampon"}, {"TPC 90"},
-                                 {"Grave"}, {1.30, 2.00, 3.50});
+            return UpdateNetwork(bdr, 1, "EU 1", {"PVC 200"}, {"Joint"}, {"Regard"}, {"Tampon"}, {"TPC 90"}, {"Grave"},
+                                 {1.30, 2.00, 3.50});
         };
         ASSERT_TRUE(update());
         for (const auto& article : bdr.Articles()) {
@@ -132,7 +148,8 @@ TEST(UpdateNetwork, EmptyPrefixTakesTheFirstTwoCharactersOfTheName)
 {
     CZodEVIBdr bdr;
     ASSERT_TRUE(Update(bdr, 12, "Réseau X", {"C 3x2"}));
-    EXPECT_EQ(ByKey(bdr, "Réseau X", "RSX_LIN_TOT_3D")->treePath, R"(Réseau X\\Câble\\Linéaire\\Ré-001 - Longueur 3D totale)");
+    EXPECT_EQ(ByKey(bdr, "Réseau X", "RSX_LIN_TOT_3D")->treePath,
+              R"(Réseau X\\Câble\\Linéaire\\Ré-001 - Longueur 3D totale)");
     EXPECT_EQ(ByKey(bdr, "Réseau X", "RSX_TUY_LIN_3D_C 3x2")->code, "Ré-002");
     EXPECT_EQ(ByKey(bdr, "Réseau X", "RSX_BRA_LIN_3D"), nullptr); // EP and EU only
 }
@@ -145,7 +162,8 @@ TEST(UpdateNetwork, DepthBoundsMakeOneArticlePerClass)
         Names keys;
     };
     const Case cases[] = {
-        {"three bounds", {1.30, 2.00, 3.50},
+        {"three bounds",
+         {1.30, 2.00, 3.50},
          {"RSX_VOL_1.30_2.00", "RSX_VOL_2.00_3.50", "RSX_VOL_3.50", "RSX_LIN_1.30_2.00_2D", "RSX_LIN_2.00_3.50_2D",
           "RSX_LIN_3.50_2D", "RSX_BRA_VOL_1.30_2.00", "RSX_BRA_VOL_2.00_3.50", "RSX_BRA_VOL_3.50"}},
         {"one bound", {1.5}, {"RSX_VOL_1.50", "RSX_LIN_1.50_2D", "RSX_BRA_VOL_1.50"}},
@@ -320,7 +338,8 @@ TEST(UpdateDepthClasses, AppliesBoundsToEveryNetworkByItsOwnName)
 
     const CZodEVIArticle* eu = ByKey(bdr, "EU (tranche 2)", "RSX_VOL_1.00_2.00");
     ASSERT_NE(eu, nullptr);
-    EXPECT_TRUE(eu->treePath.starts_with(R"(EU (tranche 2)\\Travaux de génie civil\\Terrassements\\Tranchées\\Volumique\\)"))
+    EXPECT_TRUE(
+        eu->treePath.starts_with(R"(EU (tranche 2)\\Travaux de génie civil\\Terrassements\\Tranchées\\Volumique\\)"))
         << eu->treePath;
     EXPECT_NE(ByKey(bdr, "EU (tranche 2)", "RSX_BRA_VOL_2.00"), nullptr);
     EXPECT_NE(ByKey(bdr, "AEP", "RSX_LIN_2.00_2D"), nullptr);

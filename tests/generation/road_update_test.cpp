@@ -56,11 +56,15 @@ TEST(UpdateMaterials, MakesTheArticlesOfEachList)
         const char* treePath;
     };
     const Expected expected[] = {
-        {"PRJ_VOL_MAT_Grave", "m³", R"(Voirie\\Matériaux de structure\\Volumique\\GC-001 - Fourniture et mise en oeuvre de Grave)"},
+        {"PRJ_VOL_MAT_Grave", "m³",
+         R"(Voirie\\Matériaux de structure\\Volumique\\GC-001 - Fourniture et mise en oeuvre de Grave)"},
         {"PRJ_TON_MAT_Grave", "tonne", R"(Voirie\\Matériaux de structure\\Volumique\\GC-002 - Grave en tonnes)"},
-        {"PRJ_SFC_MAT_Enduit", "m²", R"(Voirie\\Surface de matériaux (enduits, pavés...)\\Surfacique\\GC-003 - Fourniture et mise en oeuvre de Enduit)"},
-        {"PRJ_LIN_MAT_Bordure T2", "ml", R"(Voirie\\Bordures, caniveaux...\\Linéaire\\GC-004 - Fourniture et mise en oeuvre de Bordure T2)"},
-        {"PRJ_VOL_RPF_Grave", "m³", R"(Voirie\\Travaux sur chaussées existantes\\Volumique\\GC-005 - Volume de reprofilage de Grave)"},
+        {"PRJ_SFC_MAT_Enduit", "m²",
+         R"(Voirie\\Surface de matériaux (enduits, pavés...)\\Surfacique\\GC-003 - Fourniture et mise en oeuvre de Enduit)"},
+        {"PRJ_LIN_MAT_Bordure T2", "ml",
+         R"(Voirie\\Bordures, caniveaux...\\Linéaire\\GC-004 - Fourniture et mise en oeuvre de Bordure T2)"},
+        {"PRJ_VOL_RPF_Grave", "m³",
+         R"(Voirie\\Travaux sur chaussées existantes\\Volumique\\GC-005 - Volume de reprofilage de Grave)"},
     };
     ASSERT_EQ(group->size(), std::size(expected));
     for (std::size_t i = 0; i < group->size(); ++i) {

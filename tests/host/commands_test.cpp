@@ -11,8 +11,14 @@
 namespace {
 
 int g_runs = 0;
-void Count() { ++g_runs; }
-void Throw() { throw std::runtime_error("disque plein"); }
+void Count()
+{
+    ++g_runs;
+}
+void Throw()
+{
+    throw std::runtime_error("disque plein");
+}
 
 class CommandStack : public ::testing::Test {
 protected:
@@ -34,10 +40,16 @@ TEST_F(CommandStack, LookupByLocalGlobalAndUnderscore)
         const char* globalFound; // null: not found
     };
     const Case cases[] = {
-        {"zodevicreate", "VelaZodEVICreate"}, {"VELAZODEVICREATE", "VelaZodEVICreate"},
-        {"_velazodevicreate", "VelaZodEVICreate"}, {"_ZodEVICreate", nullptr},
+        {"zodevicreate", "VelaZodEVICreate"},
+        {"VELAZODEVICREATE", "VelaZodEVICreate"},
+        {"_velazodevicreate", "VelaZodEVICreate"},
+        {"_ZodEVICreate", nullptr},
         // A local name wins over another command's global name.
-        {"beta", "Alpha"}, {"_beta", "Beta"}, {"gamma", "Beta"}, {"", nullptr}, {"_", nullptr},
+        {"beta", "Alpha"},
+        {"_beta", "Beta"},
+        {"gamma", "Beta"},
+        {"", nullptr},
+        {"_", nullptr},
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.typed);

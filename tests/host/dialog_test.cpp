@@ -47,7 +47,7 @@ TEST(SECTreeCtrl, HitTestFollowsRowsIndentAndScrolling)
     HTREEITEM child = tree.InsertItem("enfant", b);
     tree.InsertItem("A", b);
     tree.SortChildren(TVI_ROOT);
-    EXPECT_EQ(tree.GetRootItem(), b);  // "b" < "Éa" ignoring case
+    EXPECT_EQ(tree.GetRootItem(), b); // "b" < "Éa" ignoring case
     EXPECT_EQ(tree.GetChildItem(b), tree.GetPrevSiblingItem(child));
     tree.Expand(b, TVE_EXPAND);
 
@@ -56,9 +56,9 @@ TEST(SECTreeCtrl, HitTestFollowsRowsIndentAndScrolling)
         HTREEITEM item;
         unsigned flags;
     } cases[] = {
-        {{1, 0}, b, TVHT_ONITEMICON},      {{4, 0}, b, TVHT_ONITEMLABEL},  {{40, 0}, b, TVHT_ONITEMRIGHT},
+        {{1, 0}, b, TVHT_ONITEMICON},         {{4, 0}, b, TVHT_ONITEMLABEL},    {{40, 0}, b, TVHT_ONITEMRIGHT},
         {{2, 1}, nullptr, TVHT_ONITEMINDENT}, {{5, 2}, child, TVHT_ONITEMICON}, {{9, 2}, child, TVHT_ONITEMLABEL},
-        {{0, 3}, a, TVHT_ONITEMICON},      {{0, 4}, nullptr, TVHT_NOWHERE}, {{-1, 0}, nullptr, TVHT_NOWHERE},
+        {{0, 3}, a, TVHT_ONITEMICON},         {{0, 4}, nullptr, TVHT_NOWHERE},  {{-1, 0}, nullptr, TVHT_NOWHERE},
     };
     for (const auto& c : cases) {
         SCOPED_TRACE(testing::Message() << c.point.x << "," << c.point.y);
@@ -103,8 +103,8 @@ TEST(CVelDialog, KeysRadioButtonsAndButtons)
     EXPECT_EQ(dialog.modeClicks, 1);
     EXPECT_EQ(dialog.GetFocusId(), 21);
     dialog.Resize(120, 60);
-    EXPECT_EQ(dialog.GetControlRect(10).width, 50);  // no rule: the control stays
-    dialog.KeyDown(VK_RETURN);  // not on a button: the default button
+    EXPECT_EQ(dialog.GetControlRect(10).width, 50); // no rule: the control stays
+    dialog.KeyDown(VK_RETURN);                      // not on a button: the default button
     EXPECT_TRUE(dialog.IsEnded());
     EXPECT_EQ(dialog.GetResult(), IDOK);
     EXPECT_EQ(dialog.mode, 1);

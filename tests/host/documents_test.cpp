@@ -66,9 +66,9 @@ TEST_F(DocManager, CreateSwitchAndCloseAreAnnounced)
     recorder.events.clear();
     ASSERT_TRUE(dm->closeDocument(first));
     // The closing document is gone from the open documents before another becomes current.
-    EXPECT_EQ(recorder.events, (std::vector<std::string>{"toBeDestroyed " + a, "destroyed " + a,
-                                                         "toBeActivated plan.dxf", "becameCurrent plan.dxf",
-                                                         "activated plan.dxf"}));
+    EXPECT_EQ(recorder.events,
+              (std::vector<std::string>{"toBeDestroyed " + a, "destroyed " + a, "toBeActivated plan.dxf",
+                                        "becameCurrent plan.dxf", "activated plan.dxf"}));
     EXPECT_EQ(dm->curDocument(), second);
     EXPECT_FALSE(dm->closeDocument(first));
     ASSERT_TRUE(dm->closeDocument(second));

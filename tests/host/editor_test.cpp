@@ -15,11 +15,18 @@ TEST(GetKword, AnswersTheGlobalKeyword)
         const char* result;
     };
     const Case cases[] = {
-        {"Oui\n", RTNORM, "Yes"}, {"non\n", RTNORM, "No"}, {"N\n", RTNORM, "No"}, {"o\n", RTNORM, "Yes"},
-        {"_no\n", RTNORM, "No"}, {"_Y\n", RTNORM, "Yes"}, {"\n", RTNONE, ""},
+        {"Oui\n", RTNORM, "Yes"},
+        {"non\n", RTNORM, "No"},
+        {"N\n", RTNORM, "No"},
+        {"o\n", RTNORM, "Yes"},
+        {"_no\n", RTNORM, "No"},
+        {"_Y\n", RTNORM, "Yes"},
+        {"\n", RTNONE, ""},
         // A wrong answer is refused and asked again.
-        {"peut-être\nNon\n", RTNORM, "No"}, {"Nonne\nOui\n", RTNORM, "Yes"},
-        {"^C\n", RTCAN, "inchangé"}, {"", RTCAN, "inchangé"},
+        {"peut-être\nNon\n", RTNORM, "No"},
+        {"Nonne\nOui\n", RTNORM, "Yes"},
+        {"^C\n", RTCAN, "inchangé"},
+        {"", RTCAN, "inchangé"},
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.typed);

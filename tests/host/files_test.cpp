@@ -41,7 +41,7 @@ TEST(VelFileWriter, ReplacedFileKeepsModeLinkAndBackup)
     const mode_t savedMask = umask(027);
     struct Case {
         const char* name;
-        const char* existing;  // null: no file before
+        const char* existing; // null: no file before
         mode_t mode;
         bool backup;
         mode_t expectedMode;

@@ -8,14 +8,13 @@
 
 namespace {
 
-constexpr const char* kSample =
-    "; réglages\n"
-    "[VuzazORE]\n"
-    "Bordereau = /data/VelaBordereau.xml  \n"
-    "Cite=\"  avec espaces  \"\n"
-    "\n"
-    "[Autre]\n"
-    "Bordereau=autre\n";
+constexpr const char* kSample = "; réglages\n"
+                                "[VuzazORE]\n"
+                                "Bordereau = /data/VelaBordereau.xml  \n"
+                                "Cite=\"  avec espaces  \"\n"
+                                "\n"
+                                "[Autre]\n"
+                                "Bordereau=autre\n";
 
 TEST(IniRead, SectionAndKeyIgnoreCase)
 {
@@ -27,9 +26,13 @@ TEST(IniRead, SectionAndKeyIgnoreCase)
         const char* expected;
     };
     const Case cases[] = {
-        {"VuzazORE", "Bordereau", "/data/VelaBordereau.xml"}, {"vuzazore", "BORDEREAU", "/data/VelaBordereau.xml"},
-        {"VuzazORE", "Cite", "  avec espaces  "}, {"Autre", "bordereau", "autre"},
-        {"VuzazORE", "Absent", "défaut"}, {"Absente", "Bordereau", "défaut"}, {"VuzazORE", "; réglages", "défaut"},
+        {"VuzazORE", "Bordereau", "/data/VelaBordereau.xml"},
+        {"vuzazore", "BORDEREAU", "/data/VelaBordereau.xml"},
+        {"VuzazORE", "Cite", "  avec espaces  "},
+        {"Autre", "bordereau", "autre"},
+        {"VuzazORE", "Absent", "défaut"},
+        {"Absente", "Bordereau", "défaut"},
+        {"VuzazORE", "; réglages", "défaut"},
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(std::string(c.section) + "/" + c.key);
@@ -64,7 +67,8 @@ TEST(IniWrite, KeepsEveryOtherByte)
         {"replace", kSample, "vuzazore", "BORDEREAU", "/n.xml",
          "; réglages\n[VuzazORE]\nBordereau=/n.xml\nCite=\"  avec espaces  \"\n\n[Autre]\nBordereau=autre\n"},
         {"new key ends its section", kSample, "VuzazORE", "Neuf", "1",
-         "; réglages\n[VuzazORE]\nBordereau = /data/VelaBordereau.xml  \nCite=\"  avec espaces  \"\nNeuf=1\n\n[Autre]\nBordereau=autre\n"},
+         "; réglages\n[VuzazORE]\nBordereau = /data/VelaBordereau.xml  \nCite=\"  avec espaces  "
+         "\"\nNeuf=1\n\n[Autre]\nBordereau=autre\n"},
         {"new section ends the file", "[A]\nx=1", "B", "y", "2", "[A]\nx=1\n[B]\ny=2\n"},
         {"line ends kept", crlf, "A", "z", "3", "[A]\r\nx=1\r\nz=3\r\n\r\n[B]\r\ny=2\r\n"},
         {"delete key", crlf, "B", "y", nullptr, "[A]\r\nx=1\r\n\r\n[B]\r\n"},
@@ -94,7 +98,7 @@ TEST(IniWrite, RefusesWhatWouldCorruptTheFile)
     };
     const Case cases[] = {
         {"break in value", "S", "K", "a\nb"}, {"break in key", "S", "K\r", "v"}, {"= in key", "S", "a=b", "v"},
-        {"] in section", "S]", "K", "v"}, {"empty section", "", "K", "v"}, {"no section", nullptr, "K", "v"},
+        {"] in section", "S]", "K", "v"},     {"empty section", "", "K", "v"},   {"no section", nullptr, "K", "v"},
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.name);

@@ -20,10 +20,7 @@ std::string ModulePath(const char* name)
 
 class DynamicLinker : public ::testing::Test {
 protected:
-    void SetUp() override
-    {
-        velHostSettings().modulesDir = VEL_TEST_MODULE_DIR;
-    }
+    void SetUp() override { velHostSettings().modulesDir = VEL_TEST_MODULE_DIR; }
     void TearDown() override
     {
         velUnloadAllModules();

@@ -41,9 +41,8 @@ TEST(SysVars, HostVariablesRoundTripWithinRange)
         int status;
     };
     const Case cases[] = {
-        {"CMDECHO", 0, RTNORM}, {"cmdecho", 1, RTNORM}, {"CMDECHO", 2, RTERROR},
-        {"UCSFOLLOW", 1, RTNORM}, {"UCSFOLLOW", -1, RTERROR}, {"AFLAGS", 10, RTNORM},
-        {"AFLAGS", 128, RTERROR}, {"NOSUCHVAR", 0, RTERROR},
+        {"CMDECHO", 0, RTNORM},     {"cmdecho", 1, RTNORM}, {"CMDECHO", 2, RTERROR},  {"UCSFOLLOW", 1, RTNORM},
+        {"UCSFOLLOW", -1, RTERROR}, {"AFLAGS", 10, RTNORM}, {"AFLAGS", 128, RTERROR}, {"NOSUCHVAR", 0, RTERROR},
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.name);

@@ -21,8 +21,14 @@ TEST(ScriptComment, StrippedOnlyWhereItStarts)
         const char* expected; // null: the line is only a comment
     };
     const Case cases[] = {
-        {"; tout le commentaire", nullptr}, {"   ;indenté", nullptr}, {"OPEN plan.dxf ; le plan", "OPEN plan.dxf"},
-        {"SETVAR A;B", "SETVAR A;B"}, {"", ""}, {"Non\r", "Non"}, {"Non\r\r", "Non"}, {"  espaces  ", "  espaces"},
+        {"; tout le commentaire", nullptr},
+        {"   ;indenté", nullptr},
+        {"OPEN plan.dxf ; le plan", "OPEN plan.dxf"},
+        {"SETVAR A;B", "SETVAR A;B"},
+        {"", ""},
+        {"Non\r", "Non"},
+        {"Non\r\r", "Non"},
+        {"  espaces  ", "  espaces"},
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.line);

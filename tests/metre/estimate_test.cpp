@@ -51,18 +51,35 @@ protected:
                    {Key("\"PRJ_SFC_MAT_Enrobé\""), velRbString(kXdAsciiString, "250.5 m2")});
         AddProject(*db, "VELANTO_PFM_VRD", "PROJECTS", "F1", "Plateforme",
                    {Key("\"prj_sfc_mat_enrobé\""), velRbLong(kXdInteger32, 100)});
-        lines = {{.label = "Tuyau PVC 200", .lineKind = 3, .quantityKey = "\"RSX_TUY_LIN_3D_PVC 200\"",
-                  .projects = "EU1", .projectKind = 3, .treePath = kPipePath, .unit = "ml", .unitPrice = 45.5},
-                 {.label = "Enrobé", .lineKind = 3, .quantityKey = "\"PRJ_SFC_MAT_Enrobé\"",
-                  .projects = "Route A,Plateforme", .projectKind = 2, .treePath = kPavingPath, .unit = "m²",
-                  .unitPrice = 12.345},
-                 {.label = "Essais", .lineKind = 5, .projects = "**Forfait", .treePath = kTestsPath,
-                  .unitPrice = 1.005},
-                 {.label = "Tuyau PVC 200 (EU2)", .lineKind = 3, .quantityKey = "\"RSX_TUY_LIN_3D_PVC 200\"",
-                  .projects = "EU2", .projectKind = 3, .treePath = kPipePath, .unit = "ml", .unitPrice = 45.5}};
-        for (const auto& [code, path, rate] : {std::tuple{"EU-001", kPipePath, 19.6},
-                                              std::tuple{"TP-004", kPavingPath, 19.6},
-                                              std::tuple{"DV-001", kTestsPath, 5.5}}) {
+        lines = {
+            {.label = "Tuyau PVC 200",
+             .lineKind = 3,
+             .quantityKey = "\"RSX_TUY_LIN_3D_PVC 200\"",
+             .projects = "EU1",
+             .projectKind = 3,
+             .treePath = kPipePath,
+             .unit = "ml",
+             .unitPrice = 45.5},
+            {.label = "Enrobé",
+             .lineKind = 3,
+             .quantityKey = "\"PRJ_SFC_MAT_Enrobé\"",
+             .projects = "Route A,Plateforme",
+             .projectKind = 2,
+             .treePath = kPavingPath,
+             .unit = "m²",
+             .unitPrice = 12.345},
+            {.label = "Essais", .lineKind = 5, .projects = "**Forfait", .treePath = kTestsPath, .unitPrice = 1.005},
+            {.label = "Tuyau PVC 200 (EU2)",
+             .lineKind = 3,
+             .quantityKey = "\"RSX_TUY_LIN_3D_PVC 200\"",
+             .projects = "EU2",
+             .projectKind = 3,
+             .treePath = kPipePath,
+             .unit = "ml",
+             .unitPrice = 45.5}};
+        for (const auto& [code, path, rate] :
+             {std::tuple{"EU-001", kPipePath, 19.6}, std::tuple{"TP-004", kPavingPath, 19.6},
+              std::tuple{"DV-001", kTestsPath, 5.5}}) {
             auto a = std::make_unique<CZodEVIArticle>();
             a->code = code;
             a->treePath = path;
@@ -90,8 +107,8 @@ protected:
 
 TEST(Rounding, HalfAwayFromZeroOnTheShownDecimals)
 {
-    const double cases[][2] = {{1.005, 1.01}, {2.675, 2.68}, {-1.005, -1.01}, {0.125, 0.13},
-                               {5617.428, 5617.43}, {0.0049, 0}, {1e15 + 0.25, 1e15 + 0.25}};
+    const double cases[][2] = {{1.005, 1.01},       {2.675, 2.68}, {-1.005, -1.01},           {0.125, 0.13},
+                               {5617.428, 5617.43}, {0.0049, 0},   {1e15 + 0.25, 1e15 + 0.25}};
     for (const auto& c : cases) {
         SCOPED_TRACE(c[0]);
         EXPECT_DOUBLE_EQ(metre::RoundToCents(c[0]), c[1]);
@@ -168,8 +185,8 @@ TEST_F(EstimateTest, LineQuantitiesFollowTheirProjectsAndKinds)
     AddProject(*db, "VELANTO_ROUT2_DICT", "VELANTO_ROUT2_PROJ", "R3", "Route B",
                {Key("\"PRJ_BOR\""), velRbReal(kXdReal, 2.5)});
     const std::string parkings = EncodeLineProjects({{"Parking", kProjectRoad}, {"Parking", kProjectPlatform}});
-    const std::string roads = EncodeLineProjects(
-        {{"**Voirie", kProjectPlatform}, {"Parking", kProjectRoad}, {"Route B", kProjectRoad}});
+    const std::string roads =
+        EncodeLineProjects({{"**Voirie", kProjectPlatform}, {"Parking", kProjectRoad}, {"Route B", kProjectRoad}});
     struct Case {
         const char* what;
         int lineKind;
@@ -203,8 +220,14 @@ TEST_F(EstimateTest, LineQuantitiesFollowTheirProjectsAndKinds)
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.what);
-        lines = {{.label = c.what, .lineKind = c.lineKind, .quantityKey = c.key, .assocText1 = c.assocText1,
-                  .projects = c.projects, .projectKind = c.projectKind, .treePath = *c.treePath, .unitPrice = 2}};
+        lines = {{.label = c.what,
+                  .lineKind = c.lineKind,
+                  .quantityKey = c.key,
+                  .assocText1 = c.assocText1,
+                  .projects = c.projects,
+                  .projectKind = c.projectKind,
+                  .treePath = *c.treePath,
+                  .unitPrice = 2}};
         const metre::Estimate estimate = Build();
         ASSERT_EQ(estimate.RowCount(), 1u);
         const metre::EstimateRow& row = estimate.chapters[0].rows[0];
@@ -220,16 +243,46 @@ TEST_F(EstimateTest, LineQuantitiesFollowTheirProjectsAndKinds)
 // What an estimator must look at before sending, line by line.
 TEST_F(EstimateTest, ChecksBeforeSending)
 {
-    lines = {{.label = "Bon", .lineKind = 3, .quantityKey = "\"PRJ_SFC_MAT_Enrobé\"", .projects = "Route A",
-              .projectKind = 2, .treePath = kPavingPath, .unit = "m²", .unitPrice = 12},
-             {.label = "Gratuit", .lineKind = 3, .quantityKey = "\"PRJ_SFC_MAT_Enrobé\"", .projects = "Route A",
-              .projectKind = 2, .treePath = kPavingPath, .unit = "m²", .unitPrice = 0.004},
-             {.label = "Sans unité", .lineKind = 3, .quantityKey = "\"PRJ_SFC_MAT_Enrobé\"", .projects = "Route A",
-              .projectKind = 2, .treePath = kPavingPath, .unit = " ", .unitPrice = 12},
-             {.label = "Inconnu", .lineKind = 3, .quantityKey = "\"PRJ_SFC_MAT_Enrobé\"", .projects = "Route A",
-              .projectKind = 2, .treePath = "X\\\\Y-1 - Inconnu", .unit = "m²", .unitPrice = 12},
-             {.label = "Démesuré", .lineKind = 3, .quantityKey = "\"PRJ_SFC_MAT_Enrobé\"", .projects = "Route A",
-              .projectKind = 2, .treePath = kPavingPath, .unit = "m²", .unitPrice = 1e300}};
+    lines = {{.label = "Bon",
+              .lineKind = 3,
+              .quantityKey = "\"PRJ_SFC_MAT_Enrobé\"",
+              .projects = "Route A",
+              .projectKind = 2,
+              .treePath = kPavingPath,
+              .unit = "m²",
+              .unitPrice = 12},
+             {.label = "Gratuit",
+              .lineKind = 3,
+              .quantityKey = "\"PRJ_SFC_MAT_Enrobé\"",
+              .projects = "Route A",
+              .projectKind = 2,
+              .treePath = kPavingPath,
+              .unit = "m²",
+              .unitPrice = 0.004},
+             {.label = "Sans unité",
+              .lineKind = 3,
+              .quantityKey = "\"PRJ_SFC_MAT_Enrobé\"",
+              .projects = "Route A",
+              .projectKind = 2,
+              .treePath = kPavingPath,
+              .unit = " ",
+              .unitPrice = 12},
+             {.label = "Inconnu",
+              .lineKind = 3,
+              .quantityKey = "\"PRJ_SFC_MAT_Enrobé\"",
+              .projects = "Route A",
+              .projectKind = 2,
+              .treePath = "X\\\\Y-1 - Inconnu",
+              .unit = "m²",
+              .unitPrice = 12},
+             {.label = "Démesuré",
+              .lineKind = 3,
+              .quantityKey = "\"PRJ_SFC_MAT_Enrobé\"",
+              .projects = "Route A",
+              .projectKind = 2,
+              .treePath = kPavingPath,
+              .unit = "m²",
+              .unitPrice = 1e300}};
     const metre::Estimate estimate = Build();
     std::vector<std::string> checks;
     for (const metre::EstimateChapter& chapter : estimate.chapters)
@@ -282,7 +335,10 @@ TEST_F(EstimateTest, CsvCells)
 
 TEST_F(EstimateTest, CsvQuotesWhatWouldSplitACell)
 {
-    lines = {{.label = "Bordure \"T2\"; pose", .lineKind = 5, .projects = "**Forfait", .treePath = kTestsPath,
+    lines = {{.label = "Bordure \"T2\"; pose",
+              .lineKind = 5,
+              .projects = "**Forfait",
+              .treePath = kTestsPath,
               .unitPrice = 1}};
     const std::string csv = metre::EstimateCsv(Build());
     EXPECT_NE(csv.find("DV-001;\"Bordure \"\"T2\"\"; pose\";"), std::string::npos) << csv;
@@ -410,8 +466,8 @@ TEST_F(EstimateTest, WorkbookHasLiveFormulasWithTheirValues)
         const std::string line = std::string(cell);
         const bool plain = line.back() == '|';
         // Cells without a computed value hold their text as value too.
-        const std::string wanted = plain ? line + line.substr(line.find('|') + 1, line.rfind('|') - line.find('|') - 1)
-                                         : line;
+        const std::string wanted =
+            plain ? line + line.substr(line.find('|') + 1, line.rfind('|') - line.find('|') - 1) : line;
         EXPECT_NE(cells.find(wanted + "\n"), std::string::npos) << cells;
     }
     EXPECT_EQ(cells.find("Devis!height7|"), std::string::npos) << "a one-line row keeps the default height";
@@ -428,7 +484,7 @@ TEST_F(EstimateTest, WorkbookFormulasGiveTheTotalsInLibreOffice)
     // A copy without the computed values, and a profile that recalculates on load: the
     // totals can then only come from the formulas.
     Shell("/usr/bin/python3 -c 'import sys, openpyxl; openpyxl.load_workbook(sys.argv[1]).save(sys.argv[2])' '" +
-        dir.File("Devis.xlsx") + "' '" + dir.File("Formules.xlsx") + "'");
+          dir.File("Devis.xlsx") + "' '" + dir.File("Formules.xlsx") + "'");
     dir.Write("profile/user/registrymodifications.xcu",
               "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n"
               "<oor:items xmlns:oor=\"http://openoffice.org/2001/registry\" "
@@ -436,7 +492,7 @@ TEST_F(EstimateTest, WorkbookFormulasGiveTheTotalsInLibreOffice)
               "<item oor:path=\"/org.openoffice.Office.Calc/Formula/Load\"><prop oor:name=\"OOXMLRecalcMode\" "
               "oor:op=\"fuse\"><value>0</value></prop></item>\n</oor:items>\n");
     const std::string log = Shell("cd '" + dir.path.string() + "' && soffice -env:UserInstallation=file://" +
-                                dir.File("profile") + " --headless --convert-to csv Formules.xlsx");
+                                  dir.File("profile") + " --headless --convert-to csv Formules.xlsx");
     const std::string csv = dir.Read("Formules.csv");
     ASSERT_FALSE(csv.empty()) << log;
     // Only the digits of each total line: the separators follow LibreOffice's locale.
@@ -467,10 +523,7 @@ protected:
         ASSERT_TRUE(metre::WriteScheduleFile(dir.File("VelaBordereau.xml"), pointers));
         metre::RememberSchedulePath(dir.File("VelaBordereau.xml"));
     }
-    void TearDown() override
-    {
-        acDocManager->closeAll();
-    }
+    void TearDown() override { acDocManager->closeAll(); }
     TempDir dir;
     ScriptedSession session{"", "devis.scr"};
     std::istringstream& script = session.input;
@@ -544,9 +597,8 @@ TEST_F(EstimateService, WriteThatFailsAnywhereLeavesEachFileWholeAndSaysWhich)
             if (status == 0)
                 return;
             const std::string reason = velFileErrorReason(FileFaults::ErrorOf(run.failed));
-            const bool workbookFailed =
-                output.str().find("Fichier « " + dir.File("Devis.xlsx") + " » non enregistré : " + reason) !=
-                std::string::npos;
+            const bool workbookFailed = output.str().find("Fichier « " + dir.File("Devis.xlsx") +
+                                                          " » non enregistré : " + reason) != std::string::npos;
             const bool csvFailed = output.str().find("Fichier « " + dir.File("Devis.csv") +
                                                      " » non enregistré : " + reason) != std::string::npos;
             ASSERT_TRUE(workbookFailed || csvFailed) << output.str();
@@ -596,9 +648,14 @@ ExampleEstimate MakeExampleEstimate()
     }
     const metre::ProjectTables tables = metre::ProjectTables::Read(*example.db);
     const auto add = [&](const CZodEVIArticle& a, const std::string& project, int kind) {
-        example.lines.push_back({.label = a.designation + " (" + project + ")", .lineKind = a.nature == 6 ? 5 : 3,
-                                 .quantityKey = a.quantityKey, .assocText1 = EncodeLineProjects({{project, kind}}),
-                                 .projects = project, .projectKind = kind, .treePath = a.treePath, .unit = a.unit,
+        example.lines.push_back({.label = a.designation + " (" + project + ")",
+                                 .lineKind = a.nature == 6 ? 5 : 3,
+                                 .quantityKey = a.quantityKey,
+                                 .assocText1 = EncodeLineProjects({{project, kind}}),
+                                 .projects = project,
+                                 .projectKind = kind,
+                                 .treePath = a.treePath,
+                                 .unit = a.unit,
                                  .unitPrice = a.unitPrice});
     };
     for (const auto& a : example.schedule) {
@@ -663,7 +720,8 @@ TEST(EstimatePrint, ExampleEstimatePrintsOnePageWide)
         SCOPED_TRACE(page.substr(0, 200));
         ++number;
         const std::string size = page.substr(0, page.find('|', page.find('|') + 1) + 1);
-        EXPECT_TRUE(size == FormatString("page %d|595x842|", number) || size == FormatString("page %d|842x595|", number))
+        EXPECT_TRUE(size == FormatString("page %d|595x842|", number) ||
+                    size == FormatString("page %d|842x595|", number))
             << "A4";
         EXPECT_EQ(page.substr(size.size(), 2), "0|") << "text lines overlap";
         for (const char* text : {"Devis : Devis", "projet_vrd.dxf", "06/12/2026"})

@@ -90,7 +90,8 @@ TEST(ScheduleEdit, TableEditsBecomeChanges)
     std::string error;
     int errorLine = 0;
     ASSERT_TRUE(metre::ParseScheduleTable(table, "t", edit, error, errorLine)) << error;
-    EXPECT_EQ(Summary(edit), (Changes{{1, kRegard}, {2, kTuyau}, {3, "Réseaux\\\\EU1\\\\Ponctuel\\\\EU-003 - Tampon"}}));
+    EXPECT_EQ(Summary(edit),
+              (Changes{{1, kRegard}, {2, kTuyau}, {3, "Réseaux\\\\EU1\\\\Ponctuel\\\\EU-003 - Tampon"}}));
     const std::vector<const CZodEVIArticle*> result = edit.Result();
     ASSERT_EQ(result.size(), 2u);
     EXPECT_EQ(result[0]->unitPrice, 14);
@@ -127,7 +128,8 @@ TEST(ScheduleEdit, BadTablesAreRefusedWithTheirLine)
         {"twice", "[article 1]\n[article 1]\n", "ligne 2 : l'article 1 figure deux fois"},
         {"out of range", "[article 3]\n", "ligne 1 : en-tête « [article N] » (N de 1 à 2)"},
         {"field first", "code = A\n", "ligne 1 : en-tête de bloc"},
-        {"new without path", "[article 1]\n\n[nouveau]\ncode = X\n", "ligne 3 : un nouvel article demande le champ treePath"},
+        {"new without path", "[article 1]\n\n[nouveau]\ncode = X\n",
+         "ligne 3 : un nouvel article demande le champ treePath"},
         {"same path", table + "[nouveau]\ntreePath = " + kTuyau + "\n", "deux articles ont le chemin"},
     };
     for (const Case& c : cases) {
@@ -206,7 +208,8 @@ TEST_F(ScheduleEditor, ScriptThatQuitsOrFailsLeavesTheFile)
         {"looked at only: closed normally", "fin\n", 0, "aucune modification"},
         {"input ends", "supprimer " + kRegard + "\n", 1, "saisie interrompue"},
         {"unknown article", "supprimer X\\\\Y - Z\nfin\n", 1, "ligne 1 du script : aucun article « X\\\\Y - Z »"},
-        {"bad value", "champ unitPrice " + kTuyau + "\ndouze\nfin\n", 1, "ligne 2 du script : champ « unitPrice » : nombre"},
+        {"bad value", "champ unitPrice " + kTuyau + "\ndouze\nfin\n", 1,
+         "ligne 2 du script : champ « unitPrice » : nombre"},
         {"unknown verb", "\nrenommer A\n", 1, "ligne 2 du script : « supprimer », « ajouter »"},
     };
     for (const Case& c : cases) {
@@ -284,13 +287,14 @@ TEST_F(ScheduleEditor, FileSavedByAnotherUserDuringTheSessionIsNotLost)
         text.replace(text.find("unitPrice=\"12.5\""), 16, "unitPrice=\"7\"");
         return text;
     }();
-    const std::string editor = dir.Write("editor.sh", "#!/bin/sh\n"
-                                                      "sed -i '0,/unitPrice=\"12.5\"/s//unitPrice=\"7\"/' '" +
-                                                          path + "'\nsed -i ':a;N;$!ba;s/unitPrice = 12.5/unitPrice = 99/2' \"$2\"\n");
+    const std::string editor =
+        dir.Write("editor.sh", "#!/bin/sh\n"
+                               "sed -i '0,/unitPrice=\"12.5\"/s//unitPrice=\"7\"/' '" +
+                                   path + "'\nsed -i ':a;N;$!ba;s/unitPrice = 12.5/unitPrice = 99/2' \"$2\"\n");
     std::filesystem::permissions(editor, std::filesystem::perms::owner_all);
     struct Case {
         const char* name;
-        const char* answer;  // null: a script
+        const char* answer; // null: a script
         int status;
         double pipe, manhole;
     } cases[] = {

@@ -130,13 +130,16 @@ std::vector<CZodEVIArticle> Varied(std::size_t count)
             const unsigned kind = random() % 4;
             // Round numbers of every magnitude and their neighbours: where "%g", fixed and
             // exponent forms part.
-            const double round = static_cast<double>(random() % 9 + 1) * std::pow(10.0, static_cast<int>(random() % 30) - 10);
+            const double round =
+                static_cast<double>(random() % 9 + 1) * std::pow(10.0, static_cast<int>(random() % 30) - 10);
             switch (field.type) {
             case CZodEVIArticleField::Type::Real:
-                a.*field.real = kind == 0 ? std::bit_cast<double>(random())
-                              : kind == 1 ? static_cast<double>(random() % 100000) / 100
-                              : kind == 2 ? (random() % 3 == 0 ? round : std::nextafter(round, random() % 2 ? 0.0 : HUGE_VAL))
-                                          : std::ldexp(static_cast<double>(random() % 1000), static_cast<int>(random() % 140) - 70);
+                a.*field.real =
+                    kind == 0   ? std::bit_cast<double>(random())
+                    : kind == 1 ? static_cast<double>(random() % 100000) / 100
+                    : kind == 2
+                        ? (random() % 3 == 0 ? round : std::nextafter(round, random() % 2 ? 0.0 : HUGE_VAL))
+                        : std::ldexp(static_cast<double>(random() % 1000), static_cast<int>(random() % 140) - 70);
                 break;
             case CZodEVIArticleField::Type::Int:
                 a.*field.integer = kind == 0 ? static_cast<int>(random()) : static_cast<int>(random() % 100);
@@ -194,13 +197,43 @@ TEST(ScheduleFile, WrittenTextIsTheDocumentsByteForByte)
 // same value to the bit, or the same refusal.
 TEST(ScheduleFile, NumbersReadAsSetFieldTextReadsThem)
 {
-    const char* values[] = {"0", "-0", "007", "42", "-17", "123456789", "1234567890", "-2147483648", "2147483647",
-                            "2147483648", "999999999999999", "9999999999999999", "12345678901234567890", "1.5",
-                            "-0.0", "1e5", "1E-400", "1e400", " 12", "12 ", "\t3\n", "+3", "+-3", "-", "", ".5",
-                            "5.", "0x10", "nan", "-inf", "12,5", "1_000"};
+    const char* values[] = {"0",
+                            "-0",
+                            "007",
+                            "42",
+                            "-17",
+                            "123456789",
+                            "1234567890",
+                            "-2147483648",
+                            "2147483647",
+                            "2147483648",
+                            "999999999999999",
+                            "9999999999999999",
+                            "12345678901234567890",
+                            "1.5",
+                            "-0.0",
+                            "1e5",
+                            "1E-400",
+                            "1e400",
+                            " 12",
+                            "12 ",
+                            "\t3\n",
+                            "+3",
+                            "+-3",
+                            "-",
+                            "",
+                            ".5",
+                            "5.",
+                            "0x10",
+                            "nan",
+                            "-inf",
+                            "12,5",
+                            "1_000"};
     const auto& fields = ArticleFields();
-    const auto real = std::find_if(fields.begin(), fields.end(), [](const auto& f) { return f.name == std::string("unitPrice"); });
-    const auto integer = std::find_if(fields.begin(), fields.end(), [](const auto& f) { return f.name == std::string("number"); });
+    const auto real =
+        std::find_if(fields.begin(), fields.end(), [](const auto& f) { return f.name == std::string("unitPrice"); });
+    const auto integer =
+        std::find_if(fields.begin(), fields.end(), [](const auto& f) { return f.name == std::string("number"); });
     for (const char* value : values) {
         for (const CZodEVIArticleField* field : {&*real, &*integer}) {
             SCOPED_TRACE(std::string(field->name) + "=\"" + value + "\"");
@@ -241,26 +274,30 @@ TEST(ScheduleFile, MalformedFilesAreRefusedWithTheirLine)
         {"missing", nullptr, "fichier introuvable"},
         {"not xml", "<?xml version=\"1.0\"?>\n<bordereau>\n<article code=\"A\">\n</bordereau>\n", "ligne 4"},
         {"text", "ceci n'est pas du XML\n", "aucun élément XML"},
-        {"other root", "<?xml version=\"1.0\"?>\n\n<devis/>\n", "ligne 3 : élément racine <bordereau> attendu, <devis>"},
+        {"other root", "<?xml version=\"1.0\"?>\n\n<devis/>\n",
+         "ligne 3 : élément racine <bordereau> attendu, <devis>"},
         {"bad real", "<bordereau>\n<article code=\"A\"/>\n<article unitPrice=\"12,5\"/>\n</bordereau>",
          "ligne 3 : article 2, champ « unitPrice » : nombre attendu, « 12,5 » trouvé"},
         {"bad int", "<bordereau>\n<article number=\"3000000000\"/>\n</bordereau>",
          "ligne 2 : article 1, champ « number » : nombre entier attendu"},
-        {"unknown field", "<bordereau>\n<article prix=\"1\"/>\n</bordereau>", "ligne 2 : article 1, champ inconnu « prix »"},
+        {"unknown field", "<bordereau>\n<article prix=\"1\"/>\n</bordereau>",
+         "ligne 2 : article 1, champ inconnu « prix »"},
         {"twice", "<bordereau>\n<article code=\"A\" code=\"B\"/>\n</bordereau>", "champ « code » en double"},
-        {"stray element", "<bordereau>\n<article/>\n<ligne/>\n</bordereau>", "ligne 3 : élément <article> attendu, <ligne>"},
+        {"stray element", "<bordereau>\n<article/>\n<ligne/>\n</bordereau>",
+         "ligne 3 : élément <article> attendu, <ligne>"},
         {"article after the root", "<bordereau>\n<article/>\n</bordereau>\n<article code=\"B\"/>\n",
          "ligne 4 : élément <article> après la fin de <bordereau> ; un bordereau n'a qu'un élément racine"},
         {"truncated", "<bordereau>\n<article code=\"A\"/>\n<article code=\"B\"", "ligne 3"},
         // Reading rewrites escapes and name ends in place; lines are those of the file.
-        {"lines after escapes", "<bordereau>\n<article\ncode=\"a&#10;b&#10;c&#10;\"\n/>\n<article prix=\"1\"/>\n</bordereau>",
+        {"lines after escapes",
+         "<bordereau>\n<article\ncode=\"a&#10;b&#10;c&#10;\"\n/>\n<article prix=\"1\"/>\n</bordereau>",
          "ligne 5 : article 2, champ inconnu « prix »"},
     };
     TempDir dir;
     for (const Case& c : cases) {
         SCOPED_TRACE(c.name);
-        const std::string path = c.content ? dir.Write(std::string(c.name) + ".xml", c.content)
-                                           : dir.File("absent.xml");
+        const std::string path =
+            c.content ? dir.Write(std::string(c.name) + ".xml", c.content) : dir.File("absent.xml");
         ArticleVector out;
         out.push_back(std::make_unique<CZodEVIArticle>());
         const metre::FileResult result = metre::ReadScheduleFile(path, out);
@@ -317,8 +354,8 @@ TEST(ScheduleFile, DirectReadingAgreesWithTheDocumentOrStandsAside)
         {"reference beyond ASCII", one("<article code=\"&#233;&#8364;\" />"), false, true},
         {"reference to NUL", one("<article code=\"a&#0;b\" />"), false, true},
         {"reference with four digits", one("<article code=\"&#0065;\" />"), false, true},
-        {"entity of a doctype", Replaced(written, "<bordereau>", "<!DOCTYPE bordereau [<!ENTITY p \"12\">]>\n<bordereau>"),
-         false, true},
+        {"entity of a doctype",
+         Replaced(written, "<bordereau>", "<!DOCTYPE bordereau [<!ENTITY p \"12\">]>\n<bordereau>"), false, true},
         {"BOM", "\xEF\xBB\xBF" + written, false, true},
         {"no declaration", written.substr(declaration.size()), false, true},
         {"other declaration", Replaced(written, "encoding=\"UTF-8\"", "encoding='UTF-8' standalone=\"yes\""), false,

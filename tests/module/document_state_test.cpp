@@ -48,7 +48,7 @@ TEST_F(DocumentState, CommandRestoresWhatItDisturbed)
     AcDbObjectId layer;
     ASSERT_EQ(db->addLayer("Réseaux", layer), Acad::eOk);
     db->setLimcheck(true);
-    db->setOsmode(32767);  // the top of its range survives the record
+    db->setOsmode(32767); // the top of its range survives the record
     CArxGlobals record;
     record.PrepareForCommand(false);
     EXPECT_TRUE(record.saved);

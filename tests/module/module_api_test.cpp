@@ -49,7 +49,7 @@ protected:
     {
         const CZodEVIStringList none;
         return Function<ZodEVI_UpdateBdrRsxFn>("ZodEVI_UpdateBdrRsx")(&index, &name, &models, &none, &none, &none,
-                                                                       &none, &none, &bounds);
+                                                                      &none, &none, &bounds);
     }
 
     // Loads the module again, so that it reads the schedule file as it is now.
@@ -312,7 +312,7 @@ TEST_F(ModuleApi, ScheduleChangedByAnotherUserIsNotOverwrittenSilently)
     const std::string pvc = "PVC 200", cast = "Fonte 150";
     struct Case {
         const char* name;
-        const char* answers;  // null: a script
+        const char* answers; // null: a script
         std::int32_t status;
         bool theirsKept;
     } cases[] = {
@@ -327,7 +327,7 @@ TEST_F(ModuleApi, ScheduleChangedByAnotherUserIsNotOverwrittenSilently)
         ASSERT_EQ(read(), kZodEVIFailed) << "no file yet";
         ASSERT_EQ(UpdateNetwork(0, "EP", {"PVC 200", "Fonte 150"}), kZodEVIOk);
         ASSERT_EQ(write(), kZodEVIOk);
-        ChangePriceOnDisk("0", "77");  // the first price of the file: another user's work
+        ChangePriceOnDisk("0", "77"); // the first price of the file: another user's work
         const std::string theirs = Schedule();
         const double mine = 31.5;
         ASSERT_EQ(setPrice(&selector, &pvc, &mine, "EP"), kZodEVIOk);

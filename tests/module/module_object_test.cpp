@@ -141,9 +141,8 @@ TEST_F(ModuleObject, StartsAndStopsThroughTheHost)
     ASSERT_NE(module.service, nullptr);
     EXPECT_EQ(module.service->GetApplicationName(), "VelVuzazORE15");
     EXPECT_EQ(module.service->GetVersion(), "10.0");
-    EXPECT_EQ(GroupCommands(),
-              (std::vector<std::string>{"VelVuzazORE15", "ZodEVIBdrPrix", "ZodEVIBdrPurge", "ZodEVICreate",
-                                        "ZodEVITest1"}));
+    EXPECT_EQ(GroupCommands(), (std::vector<std::string>{"VelVuzazORE15", "ZodEVIBdrPrix", "ZodEVIBdrPurge",
+                                                         "ZodEVICreate", "ZodEVITest1"}));
     EXPECT_NE(session.Output().find("VELANTO - Métré pour modules VRD"), std::string::npos);
 
     // Messages other than the four known ones change nothing.
@@ -185,8 +184,8 @@ TEST_F(ModuleObject, UnloadUnregistersOnlyFromMainServicesThatStay)
         CVelSrvModul module;
         module.Unload();
         Services()->remove(kVelMainServicesName);
-        EXPECT_EQ(main.modules, going ? (std::vector<std::string>{"VelVuzazORE15", "Autre"})
-                                      : (std::vector<std::string>{"Autre"}));
+        EXPECT_EQ(main.modules,
+                  going ? (std::vector<std::string>{"VelVuzazORE15", "Autre"}) : (std::vector<std::string>{"Autre"}));
     }
 }
 

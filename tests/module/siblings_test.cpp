@@ -32,10 +32,7 @@ protected:
         velHostSettings() = saved;
     }
     // A copy of the test module under another name.
-    void Install(const std::string& relative)
-    {
-        fs::create_symlink(kGood, dir.path / relative);
-    }
+    void Install(const std::string& relative) { fs::create_symlink(kGood, dir.path / relative); }
     TempDir dir;
     VelHostSettings saved;
     ScriptedSession session;
@@ -49,12 +46,15 @@ TEST_F(Siblings, ExtensionAddedOnlyWhenMissing)
         bool found;
     };
     const Case cases[] = {
-        {"modules/x.arx", "x.arx", true}, {"modules/x.arx", "x", true},
+        {"modules/x.arx", "x.arx", true},
+        {"modules/x.arx", "x", true},
         // Already carries its extension: no second one, whatever the case.
-        {"modules/x.arx", "X.ARX", true}, {"modules/a.ARX.arx", "a.ARX", false},
+        {"modules/x.arx", "X.ARX", true},
+        {"modules/a.ARX.arx", "a.ARX", false},
         // ".arx" alone is not an extension.
         {"modules/.arx.arx", ".arx", true},
-        {"Programmes/p.arx", "p", true}, {"modules/q.arx", "r", false},
+        {"Programmes/p.arx", "p", true},
+        {"modules/q.arx", "r", false},
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.asked);
@@ -93,8 +93,12 @@ TEST_F(Siblings, MissingNamesAnswerNothingWithoutSearching)
         const char* symbol;
     };
     const Case cases[] = {
-        {"x", kGoodService, ""}, {"x", kGoodService, nullptr}, {"x", "", "VelTest_Answer"},
-        {"x", nullptr, "VelTest_Answer"}, {"", kGoodService, "VelTest_Answer"}, {nullptr, kGoodService, "VelTest_Answer"},
+        {"x", kGoodService, ""},
+        {"x", kGoodService, nullptr},
+        {"x", "", "VelTest_Answer"},
+        {"x", nullptr, "VelTest_Answer"},
+        {"", kGoodService, "VelTest_Answer"},
+        {nullptr, kGoodService, "VelTest_Answer"},
     };
     for (const Case& c : cases) {
         EXPECT_EQ(GetServiceSymbol(c.file, c.service, c.symbol), nullptr);

@@ -15,9 +15,10 @@ TEST(CZodEVIArticle, FieldTableWalksTheRecordInOrder)
     std::ptrdiff_t previous = -1;
     for (const CZodEVIArticleField& field : ArticleFields()) {
         SCOPED_TRACE(field.name);
-        const void* member = field.type == CZodEVIArticleField::Type::Text ? static_cast<const void*>(&(article.*field.text))
-                           : field.type == CZodEVIArticleField::Type::Real ? static_cast<const void*>(&(article.*field.real))
-                                                                           : &(article.*field.integer);
+        const void* member =
+            field.type == CZodEVIArticleField::Type::Text   ? static_cast<const void*>(&(article.*field.text))
+            : field.type == CZodEVIArticleField::Type::Real ? static_cast<const void*>(&(article.*field.real))
+                                                            : &(article.*field.integer);
         const std::ptrdiff_t offset = static_cast<const char*>(member) - base;
         EXPECT_GT(offset, previous);
         previous = offset;
@@ -28,8 +29,9 @@ TEST(CZodEVIArticle, FieldTableWalksTheRecordInOrder)
 
 TEST(ArticleText, NatureLevels)
 {
-    const char* expected[] = {"", R"(\\Ponctuel)", R"(\\Linéaire)", R"(\\Surfacique)", R"(\\Volumique)",
-                              R"(\\Textuel)", R"(\\Non Graphique)", ""};
+    const char* expected[] = {
+        "", R"(\\Ponctuel)", R"(\\Linéaire)", R"(\\Surfacique)", R"(\\Volumique)", R"(\\Textuel)", R"(\\Non Graphique)",
+        ""};
     for (int nature = 0; nature <= 7; ++nature) {
         SCOPED_TRACE(nature);
         EXPECT_EQ(MakeNatureLevel(nature), expected[nature]);
@@ -56,7 +58,10 @@ TEST(ArticleText, TreePathCategoryAndKeys)
 
 TEST(ArticleText, NetworkNameOfKey)
 {
-    struct Case { const char* key; const char* name; };
+    struct Case {
+        const char* key;
+        const char* name;
+    };
     const Case cases[] = {
         {"PRJ_RES(EU 1)", "EU 1"},
         {"PRJ_RES(EU (tranche 2))", "EU (tranche 2)"},
@@ -90,13 +95,18 @@ TEST(ArticleText, KeyKinds)
 
 TEST(ArticleText, DeriveCategory)
 {
-    struct Case { const char* treePath; int nature; const char* category; };
+    struct Case {
+        const char* treePath;
+        int nature;
+        const char* category;
+    };
     const Case cases[] = {
         {R"(EU 1\\Canalisation EU\\Linéaire\\EU-001 - PVC 200)", 2, R"(EU 1\\Canalisation EU)"},
         // A level after the nature level goes as well.
         {R"(A\\Ponctuel\\Détail\\X-001 - d)", 1, "A"},
         // Volumes and texts are cut at their own level, like the other natures.
-        {R"(Voirie\\Terrassements\\Déblais\\Volumique\\GC-001 - Volume des déblais)", 4, R"(Voirie\\Terrassements\\Déblais)"},
+        {R"(Voirie\\Terrassements\\Déblais\\Volumique\\GC-001 - Volume des déblais)", 4,
+         R"(Voirie\\Terrassements\\Déblais)"},
         {R"(Notes\\Textuel\\TX-001 - Remarque)", 5, "Notes"},
         {R"(Divers\\Non Graphique\\TP-001 - Forfait)", 6, "Divers"},
         // An unknown nature keeps the text before the separator.

@@ -46,9 +46,14 @@ std::multimap<int, ExpectedRow> LoadExpected()
             f.push_back(Unescape(field));
         while (f.size() < 10)
             f.emplace_back();
-        rows.emplace(std::stoi(f[0]), ExpectedRow{.kind = std::stoi(f[1]), .nature = std::stoi(f[2]),
-                                                  .index = std::stoi(f[5]), .code = f[3], .unit = f[4],
-                                                  .designation = f[6], .description = f[7], .category = f[8],
+        rows.emplace(std::stoi(f[0]), ExpectedRow{.kind = std::stoi(f[1]),
+                                                  .nature = std::stoi(f[2]),
+                                                  .index = std::stoi(f[5]),
+                                                  .code = f[3],
+                                                  .unit = f[4],
+                                                  .designation = f[6],
+                                                  .description = f[7],
+                                                  .category = f[8],
                                                   .prefix = f[9]});
     }
     return rows;

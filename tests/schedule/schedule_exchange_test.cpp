@@ -65,14 +65,8 @@ struct FakeMetre final : CZodEVIBdrMetre {
 
 class ScheduleExchange : public ::testing::Test {
 protected:
-    void SetUp() override
-    {
-        SetBdrMetre(&fake);
-    }
-    void TearDown() override
-    {
-        SetBdrMetre(nullptr);
-    }
+    void SetUp() override { SetBdrMetre(&fake); }
+    void TearDown() override { SetBdrMetre(nullptr); }
     std::size_t GroupSize(const std::string& key)
     {
         const CZodEVIGroup* group = bdr.Groups().Find(key);
@@ -99,16 +93,23 @@ TEST_F(ScheduleExchange, ReadAddsTheSixRoadArticlesOnce)
         const char* treePath;
     };
     const Expected expected[] = {
-        {"TP-001", "\"\"", 6, "", "Voirie\\\\Travaux préparatoires\\\\Non Graphique\\\\TP-001 - Installation du chantier"},
-        {"TP-002", "\"\"", 6, "", "Voirie\\\\Travaux préparatoires\\\\Non Graphique\\\\TP-002 - Signalisation provisoire du chantier"},
+        {"TP-001", "\"\"", 6, "",
+         "Voirie\\\\Travaux préparatoires\\\\Non Graphique\\\\TP-001 - Installation du chantier"},
+        {"TP-002", "\"\"", 6, "",
+         "Voirie\\\\Travaux préparatoires\\\\Non Graphique\\\\TP-002 - Signalisation provisoire du chantier"},
         {"TP-003", "\"\"", 6, "",
          "Voirie\\\\Travaux préparatoires\\\\Non Graphique\\\\TP-003 - Implantation, plan de phasage et contrôle"},
-        {"GC-001", "\"PRJ_VOL_TOT_DBL\"", 4, "m³", "Voirie\\\\Terrassements\\\\Déblais\\\\Volumique\\\\GC-001 - Volume des déblais"},
-        {"GC-002", "\"PRJ_VOL_TOT_RBL\"", 4, "m³", "Voirie\\\\Terrassements\\\\Remblais\\\\Volumique\\\\GC-002 - Volume des remblais"},
+        {"GC-001", "\"PRJ_VOL_TOT_DBL\"", 4, "m³",
+         "Voirie\\\\Terrassements\\\\Déblais\\\\Volumique\\\\GC-001 - Volume des déblais"},
+        {"GC-002", "\"PRJ_VOL_TOT_RBL\"", 4, "m³",
+         "Voirie\\\\Terrassements\\\\Remblais\\\\Volumique\\\\GC-002 - Volume des remblais"},
         {"GC-003", "\"PRJ_SCI_LIN_3D\"", 2, "ml",
          "Voirie\\\\Travaux sur chaussées existantes\\\\Linéaire\\\\GC-003 - Sciage de chaussée"},
     };
-    fake.file = {{.code = "EU-001", .number = 1, .quantityKey = "\"RSX_TUY_LIN_3D_PVC 200\"", .groupKey = "PRJ_RES(EU1)",
+    fake.file = {{.code = "EU-001",
+                  .number = 1,
+                  .quantityKey = "\"RSX_TUY_LIN_3D_PVC 200\"",
+                  .groupKey = "PRJ_RES(EU1)",
                   .treePath = "Réseaux\\\\EU1\\\\EU-001 - Tuyau"}};
     for (int pass = 1; pass <= 2; ++pass) {
         SCOPED_TRACE("read " + std::to_string(pass));
@@ -135,7 +136,9 @@ TEST_F(ScheduleExchange, ReadAddsTheSixRoadArticlesOnce)
 
 TEST_F(ScheduleExchange, ReadWithCutVolumeAddsOnlyFillAndSawing)
 {
-    fake.file = {{.code = "GC-001", .quantityKey = "\"PRJ_VOL_TOT_DBL\"", .groupKey = kRoad,
+    fake.file = {{.code = "GC-001",
+                  .quantityKey = "\"PRJ_VOL_TOT_DBL\"",
+                  .groupKey = kRoad,
                   .treePath = "Voirie\\\\Volumique\\\\GC-001 - Déblais"}};
     ASSERT_TRUE(Read(bdr));
     std::vector<std::string> keys;
@@ -146,12 +149,12 @@ TEST_F(ScheduleExchange, ReadWithCutVolumeAddsOnlyFillAndSawing)
 
 TEST_F(ScheduleExchange, FailedPartialReadLeavesStoreEmpty)
 {
-    fake.file = {CZodEVIArticle{.code = "A-001", .quantityKey = "\"A\"", .groupKey = "PRJ_RES(EU1)",
-                                .treePath = "X\\\\A-001 - A"},
-                 CZodEVIArticle{.code = "A-002", .quantityKey = "\"B\"", .groupKey = "PRJ_RES(EU1)",
-                                .treePath = "X\\\\A-002 - B"},
-                 CZodEVIArticle{.code = "A-003", .quantityKey = "\"C\"", .groupKey = "0",
-                                .treePath = "X\\\\A-003 - C"}};
+    fake.file = {
+        CZodEVIArticle{
+            .code = "A-001", .quantityKey = "\"A\"", .groupKey = "PRJ_RES(EU1)", .treePath = "X\\\\A-001 - A"},
+        CZodEVIArticle{
+            .code = "A-002", .quantityKey = "\"B\"", .groupKey = "PRJ_RES(EU1)", .treePath = "X\\\\A-002 - B"},
+        CZodEVIArticle{.code = "A-003", .quantityKey = "\"C\"", .groupKey = "0", .treePath = "X\\\\A-003 - C"}};
     fake.failAfterPartialRead = true;
     EXPECT_FALSE(Read(bdr));
     EXPECT_TRUE(bdr.Articles().empty());
@@ -211,14 +214,16 @@ TEST_F(ScheduleExchange, VersionReadIsTheOneTheWriteComparesWith)
 
 TEST_F(ScheduleExchange, PricesBySelector)
 {
-    const char* const patterns[] = {"RSX_TUY_LIN_3D_", "RSX_TUY_NB_",      "RSX_FRX_LIN_3D_",      "RSX_FRX_NB_",
-                                    "RSX_PGN_LIN_3D_", "RSX_PGN_NB_",      "RSX_SBL_NB_",          "RSX_TUY_FRNT_LIN_3D_",
-                                    "RSX_SBL_FRNT_NB_", "PRJ_VOL_MAT_",    "PRJ_SFC_MAT_",         "PRJ_LIN_MAT_",
+    const char* const patterns[] = {"RSX_TUY_LIN_3D_",  "RSX_TUY_NB_",  "RSX_FRX_LIN_3D_", "RSX_FRX_NB_",
+                                    "RSX_PGN_LIN_3D_",  "RSX_PGN_NB_",  "RSX_SBL_NB_",     "RSX_TUY_FRNT_LIN_3D_",
+                                    "RSX_SBL_FRNT_NB_", "PRJ_VOL_MAT_", "PRJ_SFC_MAT_",    "PRJ_LIN_MAT_",
                                     "PRJ_TON_MAT_"};
     for (int s = 0; s <= 12; ++s)
-        fake.file.push_back({.code = FormatString("P-%03d", s), .unitPrice = 10.0 + s,
+        fake.file.push_back({.code = FormatString("P-%03d", s),
+                             .unitPrice = 10.0 + s,
                              .quantityKey = FormatString("\"%sPVC 200\"", patterns[s]),
-                             .groupKey = s <= 8 ? "PRJ_RES(EU1)" : kRoad, .treePath = FormatString("Cat\\\\P-%03d - x", s)});
+                             .groupKey = s <= 8 ? "PRJ_RES(EU1)" : kRoad,
+                             .treePath = FormatString("Cat\\\\P-%03d - x", s)});
     ASSERT_TRUE(Read(bdr));
     for (int s = 0; s <= 12; ++s) {
         SCOPED_TRACE(s);
@@ -244,10 +249,15 @@ TEST_F(ScheduleExchange, PricesBySelector)
 
 TEST_F(ScheduleExchange, EmptyNetworkMeansGeneralForGetPriceButEveryGroupForShowPrice)
 {
-    fake.file = {CZodEVIArticle{.code = "EU-001", .quantityKey = "\"RSX_FRX_NB_Té\"", .groupKey = "PRJ_RES(EU1)",
+    fake.file = {CZodEVIArticle{.code = "EU-001",
+                                .quantityKey = "\"RSX_FRX_NB_Té\"",
+                                .groupKey = "PRJ_RES(EU1)",
                                 .treePath = "R\\\\EU1\\\\EU-001 - Té EU"},
-                 CZodEVIArticle{.code = "GE-001", .unitPrice = 7, .quantityKey = "\"RSX_FRX_NB_Té\"",
-                                .groupKey = "PRJ_RES(RSX_GENERAL)", .treePath = "R\\\\GE-001 - Té général"}};
+                 CZodEVIArticle{.code = "GE-001",
+                                .unitPrice = 7,
+                                .quantityKey = "\"RSX_FRX_NB_Té\"",
+                                .groupKey = "PRJ_RES(RSX_GENERAL)",
+                                .treePath = "R\\\\GE-001 - Té général"}};
     ASSERT_TRUE(Read(bdr));
     double price = 0;
     EXPECT_TRUE(GetPrice(bdr, 3, "Té", price, ""));
@@ -260,12 +270,21 @@ TEST_F(ScheduleExchange, EmptyNetworkMeansGeneralForGetPriceButEveryGroupForShow
 
 TEST_F(ScheduleExchange, PricesPerNetworkKeepEveryDigit)
 {
-    fake.file = {CZodEVIArticle{.code = "GE-001", .unitPrice = 12345.67, .quantityKey = "\"RSX_TUY_LIN_3D_PVC\"",
-                                .groupKey = "PRJ_RES(RSX_GENERAL)", .treePath = "R\\\\GE-001 - a"},
-                 CZodEVIArticle{.code = "EU-001", .unitPrice = 1500000, .quantityKey = "\"RSX_TUY_LIN_3D_PVC\"",
-                                .groupKey = "PRJ_RES(EU (tranche 2))", .treePath = "R\\\\EU-001 - b"},
-                 CZodEVIArticle{.code = "EP-001", .unitPrice = 0.1, .quantityKey = "\"RSX_TUY_LIN_3D_PVC\"",
-                                .groupKey = "PRJ_RES(EP1)", .treePath = "R\\\\EP-001 - c"}};
+    fake.file = {CZodEVIArticle{.code = "GE-001",
+                                .unitPrice = 12345.67,
+                                .quantityKey = "\"RSX_TUY_LIN_3D_PVC\"",
+                                .groupKey = "PRJ_RES(RSX_GENERAL)",
+                                .treePath = "R\\\\GE-001 - a"},
+                 CZodEVIArticle{.code = "EU-001",
+                                .unitPrice = 1500000,
+                                .quantityKey = "\"RSX_TUY_LIN_3D_PVC\"",
+                                .groupKey = "PRJ_RES(EU (tranche 2))",
+                                .treePath = "R\\\\EU-001 - b"},
+                 CZodEVIArticle{.code = "EP-001",
+                                .unitPrice = 0.1,
+                                .quantityKey = "\"RSX_TUY_LIN_3D_PVC\"",
+                                .groupKey = "PRJ_RES(EP1)",
+                                .treePath = "R\\\\EP-001 - c"}};
     ASSERT_TRUE(Read(bdr));
     std::map<std::string, std::string> prices;
     ASSERT_TRUE(GetPricesPerNetwork(bdr, 0, "PVC", prices));
@@ -273,8 +292,8 @@ TEST_F(ScheduleExchange, PricesPerNetworkKeepEveryDigit)
     bdr.SetNetworkIndex("PRJ_RES(EU (tranche 2))", 1);
     bdr.SetNetworkIndex("PRJ_RES(EP1)", 0);
     ASSERT_TRUE(GetPricesPerNetwork(bdr, 0, "PVC", prices));
-    EXPECT_EQ(prices, (std::map<std::string, std::string>{
-                          {"*", "12345.67"}, {"EU (tranche 2)", "1500000"}, {"EP1", "0.1"}}));
+    EXPECT_EQ(prices,
+              (std::map<std::string, std::string>{{"*", "12345.67"}, {"EU (tranche 2)", "1500000"}, {"EP1", "0.1"}}));
     EXPECT_FALSE(GetPricesPerNetwork(bdr, 1, "PVC", prices));
     EXPECT_TRUE(prices.empty());
 }
@@ -309,10 +328,13 @@ TEST_F(ScheduleExchange, EditorChangesAndTheFileWrittenAfterThem)
     for (const Case& c : cases) {
         SCOPED_TRACE(c.name);
         fake = {};
-        fake.file = {{.code = "EU-001", .unitPrice = 5, .quantityKey = "\"RSX_TUY_LIN_3D_PVC\"", .groupKey = "PRJ_RES(EU1)",
-                      .treePath = pipe},
-                     {.code = "EU-002", .quantityKey = "\"RSX_TUY_NB_PVC\"", .groupKey = "PRJ_RES(EU1)",
-                      .treePath = count}};
+        fake.file = {
+            {.code = "EU-001",
+             .unitPrice = 5,
+             .quantityKey = "\"RSX_TUY_LIN_3D_PVC\"",
+             .groupKey = "PRJ_RES(EU1)",
+             .treePath = pipe},
+            {.code = "EU-002", .quantityKey = "\"RSX_TUY_NB_PVC\"", .groupKey = "PRJ_RES(EU1)", .treePath = count}};
         ASSERT_TRUE(Read(bdr));
         fake.editorAnswer = c.editorAnswer;
         if (c.changes == AddBesideAssociated) {
@@ -323,8 +345,8 @@ TEST_F(ScheduleExchange, EditorChangesAndTheFileWrittenAfterThem)
             moved.groupKey = "PRJ_RES(EU2)";
             moved.unitPrice = 8;
             // A modification of an article the schedule does not hold is dropped.
-            fake.editorChanges = {{moved, kEditModified}, {{.code = "X", .groupKey = "0",
-                                                            .treePath = "nulle part"}, kEditModified}};
+            fake.editorChanges = {{moved, kEditModified},
+                                  {{.code = "X", .groupKey = "0", .treePath = "nulle part"}, kEditModified}};
         }
         const std::size_t before = bdr.Articles().size();
         EXPECT_EQ(c.show ? ShowPrice(bdr, 0, "PVC", "EU1") : Edit(bdr, pipe), c.answer);

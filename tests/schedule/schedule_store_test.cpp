@@ -56,14 +56,14 @@ TEST(CZodEVIBdr, NumberingAfterRemovalsDoesNotReuseBehindTheCounter)
 
 TEST(CZodEVIBdr, NewCodeFillsGapsWithoutRegardToCase)
 {
-    struct Case { std::vector<std::string> codes; const char* prefix; const char* expected; };
+    struct Case {
+        std::vector<std::string> codes;
+        const char* prefix;
+        const char* expected;
+    };
     const Case cases[] = {
-        {{}, "GC", "GC-001"},
-        {{"gc-001", "GC-003"}, "GC", "GC-002"},
-        {{"GC-001", "GC-002"}, "GC", "GC-003"},
-        {{"TP-001"}, "GC", "GC-001"},
-        {{"Ré-001"}, "RÉ", "RÉ-002"},
-        {{"EU-001"}, "", "-001"},
+        {{}, "GC", "GC-001"},         {{"gc-001", "GC-003"}, "GC", "GC-002"}, {{"GC-001", "GC-002"}, "GC", "GC-003"},
+        {{"TP-001"}, "GC", "GC-001"}, {{"Ré-001"}, "RÉ", "RÉ-002"},           {{"EU-001"}, "", "-001"},
     };
     for (const auto& c : cases) {
         SCOPED_TRACE(c.expected);
@@ -168,8 +168,8 @@ TEST(CZodEVIBdr, AddEditedArticle)
          "PRJ_RES(EU1)", "PRJ_RES(EU1)"},
         {"no group compares without case", "0", "eu 1\\\\canalisation eu\\\\Linéaire\\\\U-002 - n", 2, true,
          "PRJ_RES(EU1)", "PRJ_RES(EU1)"},
-        {"existing group", "PRJ_RES(EU1)", "EU 1\\\\Canalisation EU\\\\Linéaire\\\\U-003 - n", 2, false,
-         "PRJ_RES(EU1)", "PRJ_RES(EU1)"},
+        {"existing group", "PRJ_RES(EU1)", "EU 1\\\\Canalisation EU\\\\Linéaire\\\\U-003 - n", 2, false, "PRJ_RES(EU1)",
+         "PRJ_RES(EU1)"},
         {"no category", "0", "sans chemin", 2, false, "0", nullptr},
         {"no associated neighbour", "0", "Divers\\\\Linéaire\\\\U-004 - n", 2, false, "0", nullptr},
         {"volume article finds its model", "0", "Voirie\\\\Terrassements\\\\Déblais\\\\Volumique\\\\GC-009 - n", 4,
@@ -184,7 +184,8 @@ TEST(CZodEVIBdr, AddEditedArticle)
         SCOPED_TRACE(c.name);
         CZodEVIBdr bdr;
         Add(bdr, "PRJ_RES(EU1)", "EU 1\\\\Canalisation EU\\\\Linéaire\\\\EU-001 - PVC 200");
-        Add(bdr, "PRJ_PFM(),PRJ_RTE(),PRJ_PCV()", "Voirie\\\\Terrassements\\\\Déblais\\\\Volumique\\\\GC-001 - Volume des déblais", 4);
+        Add(bdr, "PRJ_PFM(),PRJ_RTE(),PRJ_PCV()",
+            "Voirie\\\\Terrassements\\\\Déblais\\\\Volumique\\\\GC-001 - Volume des déblais", 4);
         Add(bdr, "0", "Divers\\\\Linéaire\\\\X-001 - libre");
 
         CZodEVIArticle edited;
@@ -329,7 +330,8 @@ std::string ScannedNewCode(const std::string& prefix, const CZodEVIGroup& group)
 {
     for (int n = 1;; ++n) {
         const std::string code = FormatString("%s-%03d", prefix.c_str(), n);
-        if (std::none_of(group.begin(), group.end(), [&](const CZodEVIArticle* a) { return EqualsNoCase(a->code, code); }))
+        if (std::none_of(group.begin(), group.end(),
+                         [&](const CZodEVIArticle* a) { return EqualsNoCase(a->code, code); }))
             return code;
     }
 }
@@ -458,37 +460,58 @@ TEST(CZodEVIBdr, IndexesFollowEveryEdit)
     };
     const Case cases[] = {
         {"appends keep the first of equal keys",
-         {{E::Add, "g", "\"Té\"", "EP-001", 1}, {E::Add, "g", "\"TÉ\"", "ep-002", 2}, {E::Add, "g", "\"tÉ\"", "EP-003", 3}}},
+         {{E::Add, "g", "\"Té\"", "EP-001", 1},
+          {E::Add, "g", "\"TÉ\"", "ep-002", 2},
+          {E::Add, "g", "\"tÉ\"", "EP-003", 3}}},
         {"removing the first of equal keys exposes the next",
          {{E::Add, "g", "\"T\"", "EP-001", 1}, {E::Add, "g", "\"t\"", "EP-002", 2}, {E::RemovePath, "", "", "", 1}}},
         {"removal shifts the positions after it",
-         {{E::Add, "g", "\"A\"", "EP-001", 1}, {E::Add, "g", "\"B\"", "EP-002", 2}, {E::Add, "g", "\"T\"", "EP-003", 3},
-          {E::RemoveSome, "", "", "", 1, 2}, {E::Add, "g", "\"A\"", "", 4}}},
+         {{E::Add, "g", "\"A\"", "EP-001", 1},
+          {E::Add, "g", "\"B\"", "EP-002", 2},
+          {E::Add, "g", "\"T\"", "EP-003", 3},
+          {E::RemoveSome, "", "", "", 1, 2},
+          {E::Add, "g", "\"A\"", "", 4}}},
         {"a freed code number is found again",
-         {{E::Add, "g", "\"A\"", "EP-001", 1}, {E::Add, "g", "\"B\"", "EP-002", 2}, {E::Add, "g", "\"C\"", "EP-003", 3},
-          {E::RemovePath, "", "", "", 2}, {E::Add, "g", "\"D\"", "EP-004", 4}}},
+         {{E::Add, "g", "\"A\"", "EP-001", 1},
+          {E::Add, "g", "\"B\"", "EP-002", 2},
+          {E::Add, "g", "\"C\"", "EP-003", 3},
+          {E::RemovePath, "", "", "", 2},
+          {E::Add, "g", "\"D\"", "EP-004", 4}}},
         {"only %03d forms take a number",
-         {{E::Add, "g", "\"A\"", "EP-0001", 1}, {E::Add, "g", "\"B\"", "EP-01", 2}, {E::Add, "g", "\"C\"", "EP-000", 3},
-          {E::Add, "g", "\"D\"", "EP-1000", 4}, {E::Add, "g", "\"E\"", "EP-+01", 5}, {E::Add, "g", "\"F\"", "ep-001", 6},
-          {E::Add, "g", "\"G\"", "X-EP-002", 7}, {E::Add, "g", "\"H\"", "EP-99999999999", 8}}},
+         {{E::Add, "g", "\"A\"", "EP-0001", 1},
+          {E::Add, "g", "\"B\"", "EP-01", 2},
+          {E::Add, "g", "\"C\"", "EP-000", 3},
+          {E::Add, "g", "\"D\"", "EP-1000", 4},
+          {E::Add, "g", "\"E\"", "EP-+01", 5},
+          {E::Add, "g", "\"F\"", "ep-001", 6},
+          {E::Add, "g", "\"G\"", "X-EP-002", 7},
+          {E::Add, "g", "\"H\"", "EP-99999999999", 8}}},
         {"regrouping moves the article between indexed groups",
-         {{E::Add, "g", "\"T\"", "EP-001", 1}, {E::Add, "h", "\"T\"", "EP-001", 2}, {E::Regroup, "h", "", "", 1},
+         {{E::Add, "g", "\"T\"", "EP-001", 1},
+          {E::Add, "h", "\"T\"", "EP-001", 2},
+          {E::Regroup, "h", "", "", 1},
           {E::Regroup, "new", "", "", 2}}},
         {"a replaced key and code leave the index",
-         {{E::Add, "g", "\"T\"", "EP-001", 1}, {E::Add, "g", "\"A\"", "EP-002", 2},
-          {E::Replace, "", "\"A\"", "EP-003", 1, 50}, {E::Replace, "", "\"Z\"", "", 2}}},
+         {{E::Add, "g", "\"T\"", "EP-001", 1},
+          {E::Add, "g", "\"A\"", "EP-002", 2},
+          {E::Replace, "", "\"A\"", "EP-003", 1, 50},
+          {E::Replace, "", "\"Z\"", "", 2}}},
         {"a change in place announced to the store",
-         {{E::Add, "g", "\"T\"", "EP-001", 1}, {E::Add, "g", "\"A\"", "EP-002", 2},
-          {E::InPlace, "", "\"B\"", "EP-001", 2, 90}, {E::Add, "g", "\"B\"", "", 3}}},
+         {{E::Add, "g", "\"T\"", "EP-001", 1},
+          {E::Add, "g", "\"A\"", "EP-002", 2},
+          {E::InPlace, "", "\"B\"", "EP-001", 2, 90},
+          {E::Add, "g", "\"B\"", "", 3}}},
         {"erasing through the group",
          {{E::Add, "g", "\"T\"", "EP-001", 1}, {E::Add, "g", "\"t\"", "EP-002", 2}, {E::EraseFirst, "g"}}},
         {"an edited article joins its group",
          {{E::Add, "g", "\"T\"", "EP-001", 1}, {E::Edited, "g", "\"t\"", "ep-002", 2, 7}}},
         {"numbers above the counter",
-         {{E::Add, "g", "\"A\"", "", 1, 5}, {E::Add, "g", "\"B\"", "", 2}, {E::Add, "g", "\"C\"", "", 3},
-          {E::RemovePath, "", "", "", 1}, {E::Add, "g", "\"D\"", "", 4}}},
-        {"clear then refill",
-         {{E::Add, "g", "\"T\"", "EP-001", 1}, {E::Clear}, {E::Add, "g", "\"a\"", "EP-002", 2}}},
+         {{E::Add, "g", "\"A\"", "", 1, 5},
+          {E::Add, "g", "\"B\"", "", 2},
+          {E::Add, "g", "\"C\"", "", 3},
+          {E::RemovePath, "", "", "", 1},
+          {E::Add, "g", "\"D\"", "", 4}}},
+        {"clear then refill", {{E::Add, "g", "\"T\"", "EP-001", 1}, {E::Clear}, {E::Add, "g", "\"a\"", "EP-002", 2}}},
     };
     const std::vector<std::string> keys = {"\"T\"", "\"té\"", "\"A\"", "\"b\"", "\"d\"", "\"Z\"", "\"\""};
     const std::vector<std::string> prefixes = {"EP", "ep", "X-EP", "", "EP-", std::string("EP\0X", 4)};
@@ -571,10 +594,20 @@ TEST(CZodEVIBdr, DefaultFileResolution)
     const TempDir dir;
     const std::string existing = dir.Write("existant.xml", "<bordereau/>");
 
-    struct Case { const char* name; std::string stored; std::map<int, std::string> found; std::string path; std::vector<int> asked; };
+    struct Case {
+        const char* name;
+        std::string stored;
+        std::map<int, std::string> found;
+        std::string path;
+        std::vector<int> asked;
+    };
     const Case cases[] = {
         {"stored file exists", existing, {}, existing, {}},
-        {"stored file missing", "/nulle/part.xml", {{0x27, "/trouve/VelaBordereau.xml"}}, "/trouve/VelaBordereau.xml", {4, 7, 0x27}},
+        {"stored file missing",
+         "/nulle/part.xml",
+         {{0x27, "/trouve/VelaBordereau.xml"}},
+         "/trouve/VelaBordereau.xml",
+         {4, 7, 0x27}},
         {"nothing stored", "", {{4, "/a/VelaBordereau.xml"}}, "/a/VelaBordereau.xml", {4}},
         {"nothing found", "", {}, "/donnees/VelaBordereau.xml", {4, 7, 0x27, 0x37}},
     };

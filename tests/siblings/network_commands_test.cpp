@@ -64,14 +64,8 @@ std::string Tagged(const char* network, int index, const char* kind, const char*
 
 class NetworkCommands : public ::testing::Test {
 protected:
-    void SetUp() override
-    {
-        Reset();
-    }
-    void TearDown() override
-    {
-        Clean();
-    }
+    void SetUp() override { Reset(); }
+    void TearDown() override { Clean(); }
     void Reset()
     {
         g_calls.clear();
@@ -106,33 +100,33 @@ protected:
     std::ostringstream& output = session.output;
 };
 
-const std::string kTwoNetworks =
-    Line("A01", 0, 0, 0, 40, 0, 0, Tagged("EP", 0, "TUY", "PVC 315", {1.3, 1.6})) +
-    Line("A02", 0, 0, 0, 40, 0, 0, Tagged("EP", 0, "TUY", "Béton 400", {1.6})) +
-    Point("A03", 0, 0, Tagged("EP", 0, "SBL", "Regard 1000", {1.3})) +
-    Line("A04", 0, 0, 0, 40, 0, 0, Tagged("EU", 1, "TUY", "PVC 200", {})) +
-    Line("A05", 0, 0, 0, 40, 0, 0, Tagged("EU", 1, "FRX", "TPC 90", {})) +
-    Point("A06", 0, 0, Tagged("EU", 1, "SBL_FRNT", "Tampon D400", {})) +
-    Line("A07", 0, 0, 0, 40, 0, 0, Tagged("EU", 1, "TUY_FRNT", "Grillage", {}));
+const std::string kTwoNetworks = Line("A01", 0, 0, 0, 40, 0, 0, Tagged("EP", 0, "TUY", "PVC 315", {1.3, 1.6})) +
+                                 Line("A02", 0, 0, 0, 40, 0, 0, Tagged("EP", 0, "TUY", "Béton 400", {1.6})) +
+                                 Point("A03", 0, 0, Tagged("EP", 0, "SBL", "Regard 1000", {1.3})) +
+                                 Line("A04", 0, 0, 0, 40, 0, 0, Tagged("EU", 1, "TUY", "PVC 200", {})) +
+                                 Line("A05", 0, 0, 0, 40, 0, 0, Tagged("EU", 1, "FRX", "TPC 90", {})) +
+                                 Point("A06", 0, 0, Tagged("EU", 1, "SBL_FRNT", "Tampon D400", {})) +
+                                 Line("A07", 0, 0, 0, 40, 0, 0, Tagged("EU", 1, "TUY_FRNT", "Grillage", {}));
 
-}  // namespace
+} // namespace
 
 TEST_F(NetworkCommands, UpdateHandsEachNetworkToTheSchedule)
 {
     Open(kTwoNetworks);
     OfferService();
-    g_updateAnswer = kZodEVIFailed;  // "nothing changed" is no failure of the command
+    g_updateAnswer = kZodEVIFailed; // "nothing changed" is no failure of the command
     EXPECT_TRUE(UpdateSchedule()) << output.str();
     ASSERT_EQ(g_calls.size(), 2u);
     EXPECT_EQ(g_calls[0].index, 0);
     EXPECT_EQ(g_calls[0].name, "EP");
-    EXPECT_EQ(g_calls[0].lists, (std::vector<CZodEVIStringList>{{"PVC 315", "Béton 400"}, {}, {"Regard 1000"}, {}, {}, {}}));
+    EXPECT_EQ(g_calls[0].lists,
+              (std::vector<CZodEVIStringList>{{"PVC 315", "Béton 400"}, {}, {"Regard 1000"}, {}, {}, {}}));
     EXPECT_EQ(g_calls[0].bounds, kDepthBounds);
     EXPECT_EQ(g_calls[1].index, 1);
     EXPECT_EQ(g_calls[1].name, "EU");
     EXPECT_EQ(g_calls[1].lists,
               (std::vector<CZodEVIStringList>{{"PVC 200"}, {"Grillage"}, {}, {"Tampon D400"}, {"TPC 90"}, {}}));
-    EXPECT_TRUE(g_calls[1].bounds.empty());  // no depth drawn: no depth classes
+    EXPECT_TRUE(g_calls[1].bounds.empty()); // no depth drawn: no depth classes
     EXPECT_EQ(g_writes, 1);
     EXPECT_TRUE(Printed("Réseau EP (indice 0) : 2 modèle(s) de canalisation, 1 de regard : bordereau déjà à jour."));
     EXPECT_TRUE(Printed("Réseau EU (indice 1) : 1 modèle(s) de canalisation, 0 de regard : bordereau déjà à jour."));
@@ -145,7 +139,7 @@ TEST_F(NetworkCommands, UpdateReportsEveryFailure)
         const char* name;
         bool document;
         std::string entities;
-        int service;  // 0 none, 1 without ZodEVI_WriteBdr, 2 complete
+        int service; // 0 none, 1 without ZodEVI_WriteBdr, 2 complete
         std::int32_t updateAnswer;
         std::int32_t writeAnswer;
         bool result;
@@ -154,7 +148,8 @@ TEST_F(NetworkCommands, UpdateReportsEveryFailure)
     };
     const Case cases[] = {
         {"no drawing", false, "", 2, 0, 0, false, 0, "Aucun dessin ouvert : ouvrez le dessin des réseaux d'abord."},
-        {"no network", true, "", 2, 0, 0, false, 0, "Aucun réseau dans le dessin (données VELANTO_RSX) : bordereau inchangé."},
+        {"no network", true, "", 2, 0, 0, false, 0,
+         "Aucun réseau dans le dessin (données VELANTO_RSX) : bordereau inchangé."},
         {"no metre module", true, kTwoNetworks, 0, 0, 0, false, 0,
          "Module de métré VelVuzazORE15.arx introuvable ou incomplet (fonction ZodEVI_UpdateBdrRsx absente) : "
          "bordereau non mis à jour."},
@@ -197,7 +192,7 @@ TEST_F(NetworkCommands, RecordsCommandSaysWhatItWrote)
 TEST_F(NetworkCommands, CommandsAreRegisteredUnderBothNames)
 {
     ASSERT_TRUE(AddCommands());
-    EXPECT_FALSE(AddCommands());  // a second registration is refused, the first one stays
+    EXPECT_FALSE(AddCommands()); // a second registration is refused, the first one stays
     const AcEdCommand* update = acedRegCmds()->lookupCmd("RsxMajBordereau");
     ASSERT_NE(update, nullptr);
     EXPECT_EQ(update->globalName, kUpdateGlobalName);

@@ -31,7 +31,7 @@ protected:
     }
 };
 
-}  // namespace
+} // namespace
 
 TEST_F(NetworkModule, RegistersServiceAndCommandsUntilUnloaded)
 {
@@ -54,7 +54,7 @@ TEST_F(NetworkModule, ExportedFunctionsWorkOnTheCurrentDrawing)
     ASSERT_NE(projects, nullptr);
     std::string network = "EU";
     std::vector<std::string> names{"ancien"};
-    EXPECT_EQ(write(), 1);  // no drawing open
+    EXPECT_EQ(write(), 1); // no drawing open
     EXPECT_EQ(projects(&network, &names), 1);
     EXPECT_TRUE(names.empty());
     EXPECT_EQ(projects(nullptr, &names), 2);

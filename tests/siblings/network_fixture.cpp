@@ -28,7 +28,7 @@ std::string Head(const std::string& type, const std::string& handle, const char*
     return text + Tag(8, "RESEAUX") + Tag(100, subclass);
 }
 
-}  // namespace
+} // namespace
 
 std::string XData::Text() const
 {
@@ -44,15 +44,15 @@ std::string XData::Text() const
 std::string Line(const std::string& handle, double x1, double y1, double z1, double x2, double y2, double z2,
                  const std::string& xdata)
 {
-    return Head("LINE", handle, "AcDbLine") + Real(10, x1) + Real(20, y1) + Real(30, z1) + Real(11, x2) +
-           Real(21, y2) + Real(31, z2) + xdata;
+    return Head("LINE", handle, "AcDbLine") + Real(10, x1) + Real(20, y1) + Real(30, z1) + Real(11, x2) + Real(21, y2) +
+           Real(31, z2) + xdata;
 }
 
 std::string LwPolyline(const std::string& handle, const std::vector<std::vector<double>>& vertices, bool closed,
                        const std::string& xdata)
 {
-    std::string text = Head("LWPOLYLINE", handle, "AcDbPolyline") + Tag(90, FormatInt(static_cast<int>(vertices.size()))) +
-                       Tag(70, closed ? "1" : "0");
+    std::string text = Head("LWPOLYLINE", handle, "AcDbPolyline") +
+                       Tag(90, FormatInt(static_cast<int>(vertices.size()))) + Tag(70, closed ? "1" : "0");
     for (const auto& v : vertices) {
         text += Real(10, v[0]) + Real(20, v[1]);
         if (v.size() > 2)
@@ -107,4 +107,4 @@ std::unique_ptr<AcDbDatabase> DrawingWith(const std::string& entities)
     return database;
 }
 
-}  // namespace network_test
+} // namespace network_test

@@ -25,7 +25,7 @@ const Element& OnlyElement(const NetworkDrawing& drawing)
     return drawing.networks[0].projects[0].elements[0];
 }
 
-}  // namespace
+} // namespace
 
 TEST(NetworkDrawing, MeasuresEachShape)
 {
@@ -86,11 +86,15 @@ TEST(NetworkDrawing, LeavesOutWhatItCannotUse)
          "Entité A01 (POINT) : type d'entité sans longueur (LINE, LWPOLYLINE ou POLYLINE attendu) ; ignorée."},
         {"pipe drawn as a mesh", Polyline("A01", 16, {{0, 0, 0}, {1, 0, 0}}, XData{}.Text()),
          "Entité A01 (POLYLINE) : maillage ou réseau de faces, pas une canalisation ; ignorée."},
-        {"third depth", Line("A01", 0, 0, 0, 1, 0, 0, xdata([](XData& x) { x.depths = {1, 2, 3}; })),
+        {"third depth", Line("A01", 0, 0, 0, 1, 0, 0, xdata([](XData& x) {
+                                 x.depths = {1, 2, 3};
+                             })),
          "Entité A01 (LINE) : profondeur 3 non utilisée (de 0 à 100 m, 2 au plus)."},
         {"negative useful length", Line("A01", 0, 0, 0, 1, 0, 0, xdata([](XData& x) { x.sizes = {-6}; })),
          "Entité A01 (LINE) : longueur utile -6 non utilisée (nombre de mètres positif attendu)."},
-        {"zero trench width", Line("A01", 0, 0, 0, 1, 0, 0, xdata([](XData& x) { x.sizes = {6, 0}; })),
+        {"zero trench width", Line("A01", 0, 0, 0, 1, 0, 0, xdata([](XData& x) {
+                                       x.sizes = {6, 0};
+                                   })),
          "Entité A01 (LINE) : largeur de tranchée 0 non utilisée (nombre de mètres positif attendu)."},
         {"other index for the network",
          Line("A01", 0, 0, 0, 1, 0, 0, XData{}.Text()) +
@@ -117,12 +121,13 @@ TEST(NetworkDrawing, LeavesOutWhatItCannotUse)
 
 TEST(NetworkDrawing, KeepsDepthsAndSizesThatRead)
 {
-    const auto database = DrawingWith(Line("A01", 0, 0, 0, 5, 0, 0, XData{.depths = {1.2}, .sizes = {2.5, 1.1}}.Text()));
+    const auto database =
+        DrawingWith(Line("A01", 0, 0, 0, 5, 0, 0, XData{.depths = {1.2}, .sizes = {2.5, 1.1}}.Text()));
     ASSERT_TRUE(database);
     const NetworkDrawing drawing = NetworkDrawing::Read(*database);
     const Element& element = OnlyElement(drawing);
     EXPECT_EQ(element.depthStart, 1.2);
-    EXPECT_EQ(element.depthEnd, 1.2);  // one depth: the same at both ends
+    EXPECT_EQ(element.depthEnd, 1.2); // one depth: the same at both ends
     EXPECT_EQ(element.usefulLength, 2.5);
     EXPECT_EQ(element.trenchWidth, 1.1);
     EXPECT_EQ(element.handle, 0xA01u);
@@ -133,13 +138,12 @@ TEST(NetworkDrawing, GroupsByNetworkAndProjectWithoutRegardToCase)
     const auto element = [](const char* network, int index, const char* project, const char* kind, const char* model) {
         return XData{.network = network, .index = index, .project = project, .kind = kind, .model = model}.Text();
     };
-    const std::string entities =
-        Line("A01", 0, 0, 0, 10, 0, 0, element("EP", 0, "", "TUY", "PVC 315")) +
-        Line("A02", 0, 0, 0, 10, 0, 0, element("eu", 1, "EU Nord", "TUY", "PVC 200")) +
-        Point("A03", 0, 0, element("ep", 0, "", "SBL", "Regard 1000")) +
-        Line("A04", 0, 0, 0, 10, 0, 0, element("EP", 0, "EP Sud", "TUY", "pvc 315")) +
-        Line("A05", 0, 0, 0, 10, 0, 0, element("EP", 0, "ep sud", "TUY", "Béton 400")) +
-        Point("A06", 0, 0, element("EP", 0, "", "SBL", "Regard 1000"), true);
+    const std::string entities = Line("A01", 0, 0, 0, 10, 0, 0, element("EP", 0, "", "TUY", "PVC 315")) +
+                                 Line("A02", 0, 0, 0, 10, 0, 0, element("eu", 1, "EU Nord", "TUY", "PVC 200")) +
+                                 Point("A03", 0, 0, element("ep", 0, "", "SBL", "Regard 1000")) +
+                                 Line("A04", 0, 0, 0, 10, 0, 0, element("EP", 0, "EP Sud", "TUY", "pvc 315")) +
+                                 Line("A05", 0, 0, 0, 10, 0, 0, element("EP", 0, "ep sud", "TUY", "Béton 400")) +
+                                 Point("A06", 0, 0, element("EP", 0, "", "SBL", "Regard 1000"), true);
     const auto database = DrawingWith(entities);
     ASSERT_TRUE(database);
     const NetworkDrawing drawing = NetworkDrawing::Read(*database);
@@ -149,8 +153,8 @@ TEST(NetworkDrawing, GroupsByNetworkAndProjectWithoutRegardToCase)
     ASSERT_NE(ep, nullptr);
     EXPECT_EQ(ep->name, "EP");
     ASSERT_EQ(ep->projects.size(), 2u);
-    EXPECT_EQ(ep->projects[0].name, "EP");  // an empty project name is the network's
-    EXPECT_EQ(ep->projects[0].elements.size(), 2u);  // the paper-space point is not counted
+    EXPECT_EQ(ep->projects[0].name, "EP");          // an empty project name is the network's
+    EXPECT_EQ(ep->projects[0].elements.size(), 2u); // the paper-space point is not counted
     EXPECT_EQ(ep->projects[1].name, "EP Sud");
     EXPECT_EQ(ep->projects[1].elements.size(), 2u);
     EXPECT_EQ(ep->Models(ElementKind::Pipe), (std::vector<std::string>{"PVC 315", "Béton 400"}));

@@ -87,7 +87,7 @@ std::uint32_t ProjectCount(AcDbDatabase& database)
 }
 
 std::string Tagged(const char* name, int index, const char* project, const char* kind, const char* model,
-                    std::vector<double> depths = {})
+                   std::vector<double> depths = {})
 {
     XData x;
     x.network = name;
@@ -99,16 +99,16 @@ std::string Tagged(const char* name, int index, const char* project, const char*
     return x.Text();
 }
 
-}  // namespace
+} // namespace
 
 TEST(ProjectQuantities, LengthsCountsAndTrenchClasses)
 {
     Project project{"EP Lot 1", {}};
     project.elements = {
-        Pipe("PVC 200", 13.0, 1.0, 1.4),                // mean 1.20: class 0.00-1.30, 3 pipes
-        Pipe("Béton 400", 10.0, 3.6, 4.0, 2.5, 1.0),    // mean 3.80: over 3.50, 4 pipes
-        Pipe("pvc 200", 12.005, 1.3, 1.3),              // on the bound: lower class; 2 pipes, not 3
-        Pipe("PVC 200", 5.0, std::nullopt, std::nullopt),  // no depth: no trench
+        Pipe("PVC 200", 13.0, 1.0, 1.4),                  // mean 1.20: class 0.00-1.30, 3 pipes
+        Pipe("Béton 400", 10.0, 3.6, 4.0, 2.5, 1.0),      // mean 3.80: over 3.50, 4 pipes
+        Pipe("pvc 200", 12.005, 1.3, 1.3),                // on the bound: lower class; 2 pipes, not 3
+        Pipe("PVC 200", 5.0, std::nullopt, std::nullopt), // no depth: no trench
         Counted(ElementKind::Fitting, "Regard 1000"),
         Counted(ElementKind::Fitting, "Avaloir"),
         Counted(ElementKind::Fitting, "Regard 1000"),
@@ -152,7 +152,8 @@ TEST(ProjectQuantities, DepthBelowTheFirstBoundCountsInTheFirstClass)
     // Without bounds there are no classes, and without pipes no total.
     EXPECT_EQ(Texts(ProjectQuantities(project, {})).back(), "\"RSX_TUY_NB_PVC 200\" # 2.000");
     const Project fittings{"EU", {Counted(ElementKind::Fitting, "Regard 1000")}};
-    EXPECT_EQ(Texts(ProjectQuantities(fittings, kDepthBounds)), (std::vector<std::string>{"\"RSX_SBL_NB_Regard 1000\" # 1.000"}));
+    EXPECT_EQ(Texts(ProjectQuantities(fittings, kDepthBounds)),
+              (std::vector<std::string>{"\"RSX_SBL_NB_Regard 1000\" # 1.000"}));
 }
 
 TEST(ProjectRecords, RecordReadsBackItemByItem)
@@ -209,9 +210,8 @@ TEST(ProjectRecords, RecordReadsBackItemByItem)
 
 TEST(ProjectRecords, ReplacesRecordsAndRemovesThoseOfGoneProjects)
 {
-    const auto database =
-        DrawingWith(Line("A01", 0, 0, 0, 10, 0, 0, Tagged("EU", 1, "Lot A", "TUY", "PVC 200")) +
-                    Line("A02", 0, 0, 0, 20, 0, 0, Tagged("EU", 1, "Lot B", "TUY", "PVC 200")));
+    const auto database = DrawingWith(Line("A01", 0, 0, 0, 10, 0, 0, Tagged("EU", 1, "Lot A", "TUY", "PVC 200")) +
+                                      Line("A02", 0, 0, 0, 20, 0, 0, Tagged("EU", 1, "Lot B", "TUY", "PVC 200")));
     ASSERT_TRUE(database);
     RecordReport first;
     NetworkDrawing drawing = NetworkDrawing::Read(*database);

@@ -43,7 +43,10 @@ public:
     TempDir& operator=(const TempDir&) = delete;
 
     std::string File(const std::string& name) const { return (path / name).string(); }
-    std::string Write(const std::string& name, const std::string& content) const { return WriteFile(path / name, content); }
+    std::string Write(const std::string& name, const std::string& content) const
+    {
+        return WriteFile(path / name, content);
+    }
     std::string Read(const std::string& name) const { return ReadFile(path / name); }
 
     std::filesystem::path path;

@@ -10,10 +10,14 @@ namespace {
 
 TEST(FormatReal, DecimalsAndGeneralForm)
 {
-    struct Case { double value; int decimals; const char* expected; };
+    struct Case {
+        double value;
+        int decimals;
+        const char* expected;
+    };
     const Case cases[] = {
-        {2.71828, 2, "2.72"}, {0.5, -1, "0.5"}, {1.3, 2, "1.30"}, {0.0125, 3, "0.013"},
-        {1500000, -1, "1.5e+06"}, {-3.0, 0, "-3"}, {12.5, 2, "12.50"},
+        {2.71828, 2, "2.72"},     {0.5, -1, "0.5"}, {1.3, 2, "1.30"},   {0.0125, 3, "0.013"},
+        {1500000, -1, "1.5e+06"}, {-3.0, 0, "-3"},  {12.5, 2, "12.50"},
     };
     for (const auto& c : cases) {
         SCOPED_TRACE(c.expected);
@@ -48,8 +52,8 @@ TEST(FormatString, NeverFollowsTheProcessLocale)
 
 TEST(FormatRealShortest, ReadsBackEqual)
 {
-    const double values[] = {12345.67, 1500000, 0.1, 19.6, 1e-300, 123456789.125,
-                             std::numeric_limits<double>::max(), -0.0};
+    const double values[] = {12345.67, 1500000, 0.1, 19.6, 1e-300, 123456789.125, std::numeric_limits<double>::max(),
+                             -0.0};
     for (double v : values) {
         const std::string t = FormatRealShortest(v);
         SCOPED_TRACE(t);
@@ -75,15 +79,21 @@ TEST(ParseNumbers, RejectsPartialAndAcceptsBlanks)
 
 TEST(CompareNoCase, FoldsLatinLettersOfTheWesternCodePage)
 {
-    struct Case { const char* a; const char* b; int sign; };
+    struct Case {
+        const char* a;
+        const char* b;
+        int sign;
+    };
     const Case cases[] = {
-        {"gc-001", "GC-001", 0}, {"Réseau", "RÉSEAU", 0}, {"cœur", "CŒUR", 0},
-        {"Ÿvon", "ÿVON", 0}, {"Šárka", "ŠÁRKA", 0}, {"ça", "ÇA", 0},
-        {"a", "B", -1}, {"B", "a", 1}, {"abc", "ab", 1}, {"", "", 0},
-        {"é", "f", 1},            // accented letters sort after ASCII
-        {"\xff", "z", 1},          // an invalid byte is itself, after every character
-        {"\xc3", "\xc3", 0},       // truncated sequence still equals itself
-        {"×", "÷", -1},           // the multiplication sign has no case
+        {"gc-001", "GC-001", 0}, {"Réseau", "RÉSEAU", 0},
+        {"cœur", "CŒUR", 0},     {"Ÿvon", "ÿVON", 0},
+        {"Šárka", "ŠÁRKA", 0},   {"ça", "ÇA", 0},
+        {"a", "B", -1},          {"B", "a", 1},
+        {"abc", "ab", 1},        {"", "", 0},
+        {"é", "f", 1},       // accented letters sort after ASCII
+        {"\xff", "z", 1},    // an invalid byte is itself, after every character
+        {"\xc3", "\xc3", 0}, // truncated sequence still equals itself
+        {"×", "÷", -1},      // the multiplication sign has no case
     };
     for (const auto& c : cases) {
         SCOPED_TRACE(std::string(c.a) + " / " + c.b);
@@ -110,8 +120,8 @@ TEST(Utf8, InvalidBytesBecomeReplacementCharacters)
     };
     const Case cases[] = {
         {"Décharger €", U"Décharger €"},
-        {"\xe9t\xe9", U"\uFFFDt\uFFFD"},       // Latin-1
-        {"a\xc3", U"a\uFFFD"},                  // cut in the middle of a character
+        {"\xe9t\xe9", U"\uFFFDt\uFFFD"},         // Latin-1
+        {"a\xc3", U"a\uFFFD"},                   // cut in the middle of a character
         {"\xed\xa0\x80", U"\uFFFD\uFFFD\uFFFD"}, // a surrogate
         {"\xc0\xaf", U"\uFFFD\uFFFD"},           // an overlong "/"
     };
@@ -146,7 +156,11 @@ namespace {
 
 TEST(FormatPattern, FillsOnlyWhatItIsGiven)
 {
-    struct Case { const char* pattern; std::vector<PatternArg> args; const char* expected; };
+    struct Case {
+        const char* pattern;
+        std::vector<PatternArg> args;
+        const char* expected;
+    };
     const Case cases[] = {
         {"RSX_VOL_%.2f_%.2f", {1.3, 2.0}, "RSX_VOL_1.30_2.00"},
         {"Longueur 2D %.2f m <= H <= %.2f m", {1.3}, "Longueur 2D 1.30 m <= H <= 0.00 m"},

@@ -18,19 +18,37 @@ struct Schedule {
     Schedule()
     {
         const std::string road = MakeRoadGroupKey();
-        AddFiled(bdr, {.nature = kNatureVolume, .designation = "Déblais", .unit = "m³", .quantityKey = "\"K1\"",
-                       .groupKey = road, .treePath = "Voirie\\\\Déblais\\\\Volumique\\\\GC-001 - Déblais"});
-        AddFiled(bdr, {.nature = kNatureNonGraphic, .designation = "Installation", .quantityKey = "\"\"",
+        AddFiled(bdr, {.nature = kNatureVolume,
+                       .designation = "Déblais",
+                       .unit = "m³",
+                       .quantityKey = "\"K1\"",
+                       .groupKey = road,
+                       .treePath = "Voirie\\\\Déblais\\\\Volumique\\\\GC-001 - Déblais"});
+        AddFiled(bdr, {.nature = kNatureNonGraphic,
+                       .designation = "Installation",
+                       .quantityKey = "\"\"",
                        .groupKey = road,
                        .treePath = "Voirie\\\\Travaux\\\\Non Graphique\\\\TP-001 - Installation"});
-        AddFiled(bdr, {.nature = kNatureLinear, .designation = "PVC", .unit = "m³", .quantityKey = "\"RSX_X\"",
-                       .groupKey = "PRJ_RES(EU)", .treePath = "EU\\\\Tuyaux\\\\Linéaire\\\\EU-001 - PVC"});
-        AddFiled(bdr, {.nature = kNatureNonGraphic, .designation = "Piquetage", .quantityKey = "\"\"",
+        AddFiled(bdr, {.nature = kNatureLinear,
+                       .designation = "PVC",
+                       .unit = "m³",
+                       .quantityKey = "\"RSX_X\"",
+                       .groupKey = "PRJ_RES(EU)",
+                       .treePath = "EU\\\\Tuyaux\\\\Linéaire\\\\EU-001 - PVC"});
+        AddFiled(bdr, {.nature = kNatureNonGraphic,
+                       .designation = "Piquetage",
+                       .quantityKey = "\"\"",
                        .groupKey = "PRJ_RES(EU)",
                        .treePath = "EU\\\\Travaux\\\\Non Graphique\\\\TP-001 - Piquetage"});
-        AddFiled(bdr, {.nature = kNatureLinear, .designation = "Réseaux", .unit = "m³", .quantityKey = "\"RSX_G\"",
-                       .groupKey = "PRJ_RES(RSX_GENERAL)", .treePath = "Général\\\\Linéaire\\\\G-001 - Réseaux"});
-        AddFiled(bdr, {.nature = kNatureNonGraphic, .designation = "Forfait", .groupKey = "0",
+        AddFiled(bdr, {.nature = kNatureLinear,
+                       .designation = "Réseaux",
+                       .unit = "m³",
+                       .quantityKey = "\"RSX_G\"",
+                       .groupKey = "PRJ_RES(RSX_GENERAL)",
+                       .treePath = "Général\\\\Linéaire\\\\G-001 - Réseaux"});
+        AddFiled(bdr, {.nature = kNatureNonGraphic,
+                       .designation = "Forfait",
+                       .groupKey = "0",
                        .treePath = "Divers\\\\Non Graphique\\\\F-001 - Forfait"});
         bdr.NetworkGroups(networkGroups);
         bdr.RoadProjectArticles(roadArticles);
@@ -52,7 +70,7 @@ struct Project {
     int kind;
     std::string name;
     std::vector<std::pair<std::string, double>> quantities;
-    std::string checkedAs;  // "" unchecked; the network's name for a network project
+    std::string checkedAs; // "" unchecked; the network's name for a network project
 };
 
 // What one article shows: its total and its lines' labels, projects and kinds.
@@ -60,14 +78,14 @@ struct Shown {
     double total;
     std::vector<std::string> labels;
     std::vector<std::string> projects;
-    std::vector<std::string> carried;  // assocText1
+    std::vector<std::string> carried; // assocText1
 };
 
 struct FilterCase {
     const char* name;
     std::vector<Project> projects;
     bool perProject;
-    std::map<std::string, Shown> expected;  // by designation
+    std::map<std::string, Shown> expected; // by designation
 };
 
 std::map<std::string, Shown> Filter(const Schedule& s, const std::vector<Project>& projects, bool perProject)
@@ -119,12 +137,15 @@ TEST(ArticleFilter, CheckedProjectsBringTheirArticles)
     const Shown forfait{1.0, {"Forfait"}, {"**Forfait/0"}, {"0\t**Forfait"}};
     const Shown voirie{1.0, {"Installation"}, {"**Voirie/1"}, {"1\t**Voirie"}};
     const FilterCase cases[] = {
-        {"nothing checked: the lump sums alone", {{2, "R1", {{"\"K1\"", 3}}, ""}}, true,
+        {"nothing checked: the lump sums alone",
+         {{2, "R1", {{"\"K1\"", 3}}, ""}},
+         true,
          {{"Forfait", {1.0, {"Forfait (**Forfait)"}, {"**Forfait/0"}, {"0\t**Forfait"}}}}},
         {"two road projects summed",
          {{2, "R1", {{"\"K1\"", 3}}, "R1"}, {2, "R2", {{"\"k1\"", 4.5}}, "R2"}},
          false,
-         {{"Déblais", {7.5, {"Déblais"}, {"R1,R2/2"}, {"2\tR1\n2\tR2"}}}, {"Installation", voirie},
+         {{"Déblais", {7.5, {"Déblais"}, {"R1,R2/2"}, {"2\tR1\n2\tR2"}}},
+          {"Installation", voirie},
           {"Forfait", forfait}}},
         {"two road projects in detail",
          {{2, "R1", {{"\"K1\"", 3}}, "R1"}, {2, "R2", {{"\"K1\"", 4.5}}, "R2"}},
@@ -132,9 +153,13 @@ TEST(ArticleFilter, CheckedProjectsBringTheirArticles)
          {{"Déblais", {7.5, {"Déblais (R1)", "Déblais (R2)"}, {"R1/2", "R2/2"}, {"2\tR1", "2\tR2"}}},
           {"Installation", {1.0, {"Installation (**Voirie)"}, {"**Voirie/1"}, {"1\t**Voirie"}}},
           {"Forfait", {1.0, {"Forfait (**Forfait)"}, {"**Forfait/0"}, {"0\t**Forfait"}}}}},
-        {"a second key of one table replaces, not adds", {{2, "R1", {{"\"K1\"", 2}, {"\"k1\"", 5}}, "R1"}}, false,
+        {"a second key of one table replaces, not adds",
+         {{2, "R1", {{"\"K1\"", 2}, {"\"k1\"", 5}}, "R1"}},
+         false,
          {{"Déblais", {5.0, {"Déblais"}, {"R1/2"}, {"2\tR1"}}}, {"Installation", voirie}, {"Forfait", forfait}}},
-        {"a platform alone brings the road lump sums", {{1, "Parking", {}, "Parking"}}, false,
+        {"a platform alone brings the road lump sums",
+         {{1, "Parking", {}, "Parking"}},
+         false,
          {{"Installation", voirie}, {"Forfait", forfait}}},
         {"network lump sums counted once for two projects",
          {{3, "EU 1", {{"\"RSX_X\"", 10}}, "EU"}, {3, "EU 2", {{"\"RSX_X\"", 2.5}}, "EU"}},
@@ -142,7 +167,9 @@ TEST(ArticleFilter, CheckedProjectsBringTheirArticles)
          {{"PVC", {12.5, {"PVC"}, {"EU 1,EU 2/3"}, {"3\tEU 1\n3\tEU 2"}}},
           {"Piquetage", {1.0, {"Piquetage"}, {"EU/3"}, {"3\tEU"}}},
           {"Forfait", forfait}}},
-        {"the general network counts unchecked, in any case", {{3, "rsx_General", {{"\"RSX_G\"", 4}}, ""}}, false,
+        {"the general network counts unchecked, in any case",
+         {{3, "rsx_General", {{"\"RSX_G\"", 4}}, ""}},
+         false,
          {{"Réseaux", {4.0, {"Réseaux"}, {"rsx_General/3"}, {"3\trsx_General"}}}, {"Forfait", forfait}}},
         {"a road and a platform of one name both count",
          {{2, "Parking", {{"\"K1\"", 3}}, "Parking"}, {1, "Parking", {{"\"K1\"", 4}}, "Parking"}},

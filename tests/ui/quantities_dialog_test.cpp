@@ -45,22 +45,44 @@ protected:
     void SetUp() override
     {
         const std::string road = MakeRoadGroupKey();
-        AddFiled(bdr, {.unitPrice = 9.5, .nature = 4, .designation = "Déblais", .unit = "m³",
-                       .quantityKey = "\"K1\"", .groupKey = road,
+        AddFiled(bdr, {.unitPrice = 9.5,
+                       .nature = 4,
+                       .designation = "Déblais",
+                       .unit = "m³",
+                       .quantityKey = "\"K1\"",
+                       .groupKey = road,
                        .treePath = "Voirie\\\\Terrassements\\\\Volumique\\\\GC-001 - Déblais"});
-        AddFiled(bdr, {.unitPrice = 32, .nature = 2, .designation = "Bordure", .unit = "ml",
-                       .quantityKey = "\"BT2\"", .groupKey = road,
+        AddFiled(bdr, {.unitPrice = 32,
+                       .nature = 2,
+                       .designation = "Bordure",
+                       .unit = "ml",
+                       .quantityKey = "\"BT2\"",
+                       .groupKey = road,
                        .treePath = "Voirie\\\\Bordures\\\\Linéaire\\\\A-001 - Bordure"});
-        AddFiled(bdr, {.unitPrice = 150, .nature = 1, .designation = "Bordure", .unit = "u",
-                       .quantityKey = "\"BTN\"", .groupKey = road,
+        AddFiled(bdr, {.unitPrice = 150,
+                       .nature = 1,
+                       .designation = "Bordure",
+                       .unit = "u",
+                       .quantityKey = "\"BTN\"",
+                       .groupKey = road,
                        .treePath = "Voirie\\\\Bordures\\\\Ponctuel\\\\A-002 - Bordure"});
-        AddFiled(bdr, {.unitPrice = 48, .nature = 2, .designation = "PVC 200", .unit = "ml",
-                       .quantityKey = "\"RSX_TUY\"", .groupKey = "PRJ_RES(EU)",
+        AddFiled(bdr, {.unitPrice = 48,
+                       .nature = 2,
+                       .designation = "PVC 200",
+                       .unit = "ml",
+                       .quantityKey = "\"RSX_TUY\"",
+                       .groupKey = "PRJ_RES(EU)",
                        .treePath = "EU\\\\Canalisation\\\\Linéaire\\\\EU-001 - PVC 200"});
-        AddFiled(bdr, {.unitPrice = 1200, .nature = 6, .designation = "Piquetage", .quantityKey = "\"\"",
+        AddFiled(bdr, {.unitPrice = 1200,
+                       .nature = 6,
+                       .designation = "Piquetage",
+                       .quantityKey = "\"\"",
                        .groupKey = "PRJ_RES(EU)",
                        .treePath = "EU\\\\Travaux\\\\Non Graphique\\\\TP-001 - Piquetage"});
-        AddFiled(bdr, {.unitPrice = 800, .nature = 6, .designation = "Assurance", .groupKey = "0",
+        AddFiled(bdr, {.unitPrice = 800,
+                       .nature = 6,
+                       .designation = "Assurance",
+                       .groupKey = "0",
                        .treePath = "Divers\\\\Non Graphique\\\\F-001 - Assurance"});
 
         auto db = std::make_unique<AcDbDatabase>();
@@ -71,10 +93,7 @@ protected:
         document = acDocManagerPtr()->createDocument(std::move(db), "");
     }
 
-    void TearDown() override
-    {
-        acDocManagerPtr()->closeDocument(document);
-    }
+    void TearDown() override { acDocManagerPtr()->closeDocument(document); }
 
     // Runs the dialog on script lines; answers how it ended.
     int Run(const std::string& script, DlgMetExpArt& dialog)

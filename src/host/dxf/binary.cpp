@@ -39,7 +39,7 @@ template <class T>
 T Load(const char* p)
 {
     T v;
-    std::memcpy(&v, p, sizeof v);  // files are little-endian, as this host
+    std::memcpy(&v, p, sizeof v); // files are little-endian, as this host
     return v;
 }
 
@@ -58,7 +58,7 @@ void AppendNumber(std::string& out, long long v)
     out.append(buffer, r.ptr);
 }
 
-}  // namespace
+} // namespace
 
 bool IsBinaryDxf(std::string_view bytes)
 {
@@ -255,4 +255,4 @@ bool TextToBinary(std::string_view text, bool wideCodes, std::string& binary, st
     return true;
 }
 
-}  // namespace vel::dxf
+} // namespace vel::dxf

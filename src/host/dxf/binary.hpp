@@ -20,4 +20,4 @@ bool BinaryToText(std::string_view binary, std::string& text, bool& wideCodes, s
 // Text DXF back to binary.
 bool TextToBinary(std::string_view text, bool wideCodes, std::string& binary, std::string& error);
 
-}  // namespace vel::dxf
+} // namespace vel::dxf

@@ -13,11 +13,10 @@ namespace vel::dxf {
 namespace {
 
 // Windows-1252 bytes 0x80-0x9F; 0 where the code page defines nothing.
-constexpr char16_t kCp1252High[32] = {
-    0x20AC, 0,      0x201A, 0x0192, 0x201E, 0x2026, 0x2020, 0x2021,
-    0x02C6, 0x2030, 0x0160, 0x2039, 0x0152, 0,      0x017D, 0,
-    0,      0x2018, 0x2019, 0x201C, 0x201D, 0x2022, 0x2013, 0x2014,
-    0x02DC, 0x2122, 0x0161, 0x203A, 0x0153, 0,      0x017E, 0x0178};
+constexpr char16_t kCp1252High[32] = {0x20AC, 0,      0x201A, 0x0192, 0x201E, 0x2026, 0x2020, 0x2021,
+                                      0x02C6, 0x2030, 0x0160, 0x2039, 0x0152, 0,      0x017D, 0,
+                                      0,      0x2018, 0x2019, 0x201C, 0x201D, 0x2022, 0x2013, 0x2014,
+                                      0x02DC, 0x2122, 0x0161, 0x203A, 0x0153, 0,      0x017E, 0x0178};
 
 bool Is1252(std::string_view codepage)
 {
@@ -164,7 +163,7 @@ bool Iconv(const std::string& to, const std::string& from, std::string_view in, 
     return true;
 }
 
-}  // namespace
+} // namespace
 
 TextEncoding TextEncoding::For(std::string_view acadver, std::string_view dwgcodepage)
 {
@@ -268,4 +267,4 @@ std::string EncodeText(std::string_view utf8, const TextEncoding& encoding)
     return out;
 }
 
-}  // namespace vel::dxf
+} // namespace vel::dxf

@@ -27,4 +27,4 @@ std::string EncodeText(std::string_view utf8, const TextEncoding& encoding);
 // Whether a code page name is one this reader knows how to convert.
 bool IsKnownCodepage(std::string_view codepage);
 
-}  // namespace vel::dxf
+} // namespace vel::dxf

@@ -242,7 +242,7 @@ std::unique_ptr<ObjectBody> NewTableRecord(const char* type, const char* subclas
     return body;
 }
 
-}  // namespace
+} // namespace
 
 bool DrawingFile::AddLayer(const std::string& name, std::size_t& record)
 {
@@ -291,4 +291,4 @@ std::vector<std::string> DrawingFile::ChangedHeaderVars() const
     return changed;
 }
 
-}  // namespace vel::dxf
+} // namespace vel::dxf

@@ -89,14 +89,14 @@ private:
 
     std::shared_ptr<const Source> source_;
     std::string name_;
-    bool binary_ = false;     // read from binary DXF (the source holds its text form)
-    bool wideCodes_ = true;   // binary group codes of two bytes (R13 and later)
+    bool binary_ = false;   // read from binary DXF (the source holds its text form)
+    bool wideCodes_ = true; // binary group codes of two bytes (R13 and later)
     Sections sections_;
     Header header_;
     Handles handles_;
-    std::size_t sourceCount_ = 0;                      // records read from the file; added ones follow
-    std::vector<std::unique_ptr<ObjectBody>> bodies_;  // parallel to the records, filled on use
-    std::map<std::size_t, std::vector<std::size_t>> insertions_;  // before record -> added records
+    std::size_t sourceCount_ = 0;                                // records read from the file; added ones follow
+    std::vector<std::unique_ptr<ObjectBody>> bodies_;            // parallel to the records, filled on use
+    std::map<std::size_t, std::vector<std::size_t>> insertions_; // before record -> added records
 };
 
-}  // namespace vel::dxf
+} // namespace vel::dxf

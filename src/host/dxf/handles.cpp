@@ -34,7 +34,7 @@ bool Handles::Index(const Sections& records, std::uint64_t handseed, ParseError&
                                    index_.begin() + static_cast<std::ptrdiff_t>(runs[r + 2]));
                 merged.push_back(runs[r + 2]);
             }
-            if (runs.size() % 2 == 0)  // an odd number of runs: the last one waits
+            if (runs.size() % 2 == 0) // an odd number of runs: the last one waits
                 merged.push_back(runs.back());
             runs = std::move(merged);
         }
@@ -93,4 +93,4 @@ std::uint64_t Handles::Add(std::size_t record)
     return handle;
 }
 
-}  // namespace vel::dxf
+} // namespace vel::dxf

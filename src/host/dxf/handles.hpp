@@ -32,11 +32,11 @@ public:
     bool AnyAdded() const { return !added_.empty(); }
 
 private:
-    std::vector<std::pair<std::uint64_t, std::uint32_t>> index_;  // sorted (handle, record)
-    std::map<std::uint64_t, std::size_t> added_;                  // handles of added records
-    std::map<std::uint64_t, std::size_t> madeUp_;                 // handles given to handle-less records
+    std::vector<std::pair<std::uint64_t, std::uint32_t>> index_; // sorted (handle, record)
+    std::map<std::uint64_t, std::size_t> added_;                 // handles of added records
+    std::map<std::uint64_t, std::size_t> madeUp_;                // handles given to handle-less records
     std::map<std::size_t, std::uint64_t> madeUpOf_;
     std::uint64_t next_ = 1;
 };
 
-}  // namespace vel::dxf
+} // namespace vel::dxf

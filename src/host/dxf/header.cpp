@@ -16,8 +16,8 @@ bool Header::Read(std::string_view buf, const Record* section, ParseError& error
         const Record& rec = *section;
         TagReader r(buf.substr(0, rec.end), rec.begin, rec.line);
         Tag t;
-        r.next(t);  // 0 SECTION
-        r.next(t);  // 2 HEADER
+        r.next(t); // 0 SECTION
+        r.next(t); // 2 HEADER
         std::string_view name;
         bool valueSeen = true;
         auto bad = [&](const char* expected) {
@@ -29,7 +29,7 @@ bool Header::Read(std::string_view buf, const Record* section, ParseError& error
         auto read = [&](const VelHeaderVar& var, auto& field) {
             using Field = std::remove_reference_t<decltype(field)>;
             if constexpr (std::is_same_v<Field, std::string>) {
-                field = std::string(t.value);  // decoded below, once the code page is known
+                field = std::string(t.value); // decoded below, once the code page is known
             } else if constexpr (std::is_same_v<Field, double>) {
                 const auto v = ParseReal(t.value);
                 if (!v)
@@ -171,4 +171,4 @@ void Header::Write(Writer& w, const Record* section, const std::vector<std::stri
     w.Raw(vars_.empty() ? rec.end : vars_.back().end, rec.end);
 }
 
-}  // namespace vel::dxf
+} // namespace vel::dxf

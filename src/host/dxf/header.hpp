@@ -42,13 +42,13 @@ public:
 
     // Writes the section (a new one after `section` is null) with the variables named in
     // `changed` written anew, in place or at its end, and $HANDSEED as `seed`.
-    void Write(Writer& writer, const Record* section, const std::vector<std::string>& changed,
-               std::uint64_t seed, const std::string& eol) const;
+    void Write(Writer& writer, const Record* section, const std::vector<std::string>& changed, std::uint64_t seed,
+               const std::string& eol) const;
 
 private:
     std::string Value(std::string_view name, std::uint64_t seed, const std::string& eol) const;
 
-    std::string acadver_ = "AC1009";  // a file without header is read as R12
+    std::string acadver_ = "AC1009"; // a file without header is read as R12
     TextEncoding encoding_;
     std::uint64_t handseed_ = 1;
     VelHeaderSettings settings_;
@@ -56,4 +56,4 @@ private:
     std::vector<HeaderVar> vars_;
 };
 
-}  // namespace vel::dxf
+} // namespace vel::dxf

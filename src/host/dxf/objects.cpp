@@ -37,9 +37,7 @@ std::string HexDecode(std::string_view hex)
 {
     hex = TrimRight(hex);
     std::string out;
-    auto digit = [](char c) {
-        return c <= '9' ? c - '0' : (c | 0x20) - 'a' + 10;
-    };
+    auto digit = [](char c) { return c <= '9' ? c - '0' : (c | 0x20) - 'a' + 10; };
     for (std::size_t i = 0; i + 1 < hex.size(); i += 2)
         out.push_back(static_cast<char>(digit(hex[i]) * 16 + digit(hex[i + 1])));
     return out;
@@ -121,10 +119,11 @@ bool TagsFromRb(ObjectBody& body, const resbuf* rb, const TextEncoding& encoding
         out.push_back({code, 0, body.keep(std::to_string(rb->resval.rlong))});
         return true;
     case VelRbKind::Binary:
-        out.push_back({code, 0, body.keep(HexEncode(std::string_view(
-                                    rb->resval.rbinary.buf ? rb->resval.rbinary.buf : "",
-                                    rb->resval.rbinary.buf && rb->resval.rbinary.clen > 0
-                                        ? static_cast<std::size_t>(rb->resval.rbinary.clen) : 0)))});
+        out.push_back({code, 0,
+                       body.keep(HexEncode(std::string_view(rb->resval.rbinary.buf ? rb->resval.rbinary.buf : "",
+                                                            rb->resval.rbinary.buf && rb->resval.rbinary.clen > 0
+                                                                ? static_cast<std::size_t>(rb->resval.rbinary.clen)
+                                                                : 0)))});
         return true;
     case VelRbKind::String: {
         const std::string text = rb->resval.rstring ? rb->resval.rstring : "";
@@ -155,7 +154,7 @@ std::vector<std::pair<std::size_t, std::size_t>> Groups(const std::vector<Tag>& 
     return groups;
 }
 
-}  // namespace
+} // namespace
 
 bool XDataChecker::Fail(std::string expected)
 {
@@ -239,8 +238,8 @@ bool IsDictionaryType(std::string_view type)
     return type == "DICTIONARY" || type == "ACDBDICTIONARYWDFLT";
 }
 
-bool ParseObject(std::string_view bytes, std::uint32_t firstLine, const TextEncoding& encoding,
-                 ObjectBody& body, ParseError& error)
+bool ParseObject(std::string_view bytes, std::uint32_t firstLine, const TextEncoding& encoding, ObjectBody& body,
+                 ParseError& error)
 {
     TagReader reader(bytes, 0, firstLine);
     Tag t;
@@ -364,8 +363,8 @@ std::vector<std::string> XDataApps(const std::vector<Tag>& xdata, const TextEnco
     return apps;
 }
 
-bool MergeXData(ObjectBody& body, const resbuf* list, const TextEncoding& encoding,
-                std::vector<std::string>& apps, std::string& error)
+bool MergeXData(ObjectBody& body, const resbuf* list, const TextEncoding& encoding, std::vector<std::string>& apps,
+                std::string& error)
 {
     if (list == nullptr || list->restype != kXdRegAppName) {
         error = "la liste doit commencer par le nom d'application (code 1001)";
@@ -443,7 +442,7 @@ std::size_t XrecordDataStart(const ObjectBody& body)
     return body.tags.size();
 }
 
-}  // namespace
+} // namespace
 
 resbuf* XrecordToRb(const ObjectBody& body, const TextEncoding& encoding)
 {
@@ -458,8 +457,7 @@ bool SetXrecordData(ObjectBody& body, const resbuf* list, const TextEncoding& en
 {
     std::vector<Tag> tags;
     for (const resbuf* rb = list; rb; rb = rb->rbnext) {
-        if (rb->restype <= 0 || rb->restype == 5 || rb->restype == 100 || rb->restype == 102 ||
-            rb->restype >= 1000) {
+        if (rb->restype <= 0 || rb->restype == 5 || rb->restype == 100 || rb->restype == 102 || rb->restype >= 1000) {
             error = FormatString("code %d interdit dans les données d'un XRECORD", rb->restype);
             return false;
         }
@@ -467,8 +465,7 @@ bool SetXrecordData(ObjectBody& body, const resbuf* list, const TextEncoding& en
             return false;
     }
     std::size_t start = XrecordDataStart(body);
-    if (start == body.tags.size() &&
-        (body.tags.empty() || body.tags.back().code != 280) &&
+    if (start == body.tags.size() && (body.tags.empty() || body.tags.back().code != 280) &&
         std::none_of(body.tags.begin(), body.tags.end(),
                      [](const Tag& t) { return t.code == 100 && TrimRight(t.value) == "AcDbXrecord"; })) {
         body.tags.push_back({100, 0, "AcDbXrecord"});
@@ -489,4 +486,4 @@ std::string_view FirstValue(const ObjectBody& body, int code)
     return {};
 }
 
-}  // namespace vel::dxf
+} // namespace vel::dxf

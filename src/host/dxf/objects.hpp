@@ -34,18 +34,18 @@ struct ParseError {
 // One object as its tags, with the parts the host interprets picked out.
 struct ObjectBody {
     std::string type;
-    std::uint64_t handle = 0;       // 0: the object has none (R12)
-    bool handleWritten = false;     // the file holds the handle as a tag
+    std::uint64_t handle = 0;   // 0: the object has none (R12)
+    bool handleWritten = false; // the file holds the handle as a tag
     std::uint64_t owner = 0;
-    bool dirty = false;             // must be written from the tags, not the file bytes
+    bool dirty = false; // must be written from the tags, not the file bytes
     bool isDictionary = false;
-    bool hardOwner = false;         // dictionary entries written as 360
+    bool hardOwner = false; // dictionary entries written as 360
 
-    std::vector<Tag> tags;          // own tags, from the 0 tag, without entries and XData
-    std::size_t entryPos = 0;       // where the entries stand among the tags
+    std::vector<Tag> tags;    // own tags, from the 0 tag, without entries and XData
+    std::size_t entryPos = 0; // where the entries stand among the tags
     std::vector<DictEntry> entries;
-    std::vector<Tag> xdata;         // from the first 1001 to the last XData tag
-    std::vector<Tag> tail;          // tags after the XData, kept after it
+    std::vector<Tag> xdata; // from the first 1001 to the last XData tag
+    std::vector<Tag> tail;  // tags after the XData, kept after it
 
     // Storage for the values set after reading; views into it stay valid.
     std::string_view keep(std::string value)
@@ -61,8 +61,8 @@ bool IsDictionaryType(std::string_view type);
 
 // Reads one object from its bytes (beginning with its 0 tag). False with `error` set
 // when the object is malformed.
-bool ParseObject(std::string_view bytes, std::uint32_t firstLine, const TextEncoding& encoding,
-                 ObjectBody& body, ParseError& error);
+bool ParseObject(std::string_view bytes, std::uint32_t firstLine, const TextEncoding& encoding, ObjectBody& body,
+                 ParseError& error);
 
 // Writes the object's tags.
 void WriteObject(const ObjectBody& body, std::string& out, std::string_view eol);
@@ -74,8 +74,8 @@ resbuf* XDataToRb(const std::vector<Tag>& xdata, std::string_view app, const Tex
 // Merges a result-buffer list into the object's XData: each application of the list
 // replaces its own group (an application with no item loses it). Answers the names of
 // the applications of the list, or false with `error` for a malformed list.
-bool MergeXData(ObjectBody& body, const resbuf* list, const TextEncoding& encoding,
-                std::vector<std::string>& apps, std::string& error);
+bool MergeXData(ObjectBody& body, const resbuf* list, const TextEncoding& encoding, std::vector<std::string>& apps,
+                std::string& error);
 
 // Application names in the object's XData, in order.
 std::vector<std::string> XDataApps(const std::vector<Tag>& xdata, const TextEncoding& encoding);
@@ -105,4 +105,4 @@ private:
     std::string expected_;
 };
 
-}  // namespace vel::dxf
+} // namespace vel::dxf

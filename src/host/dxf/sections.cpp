@@ -22,7 +22,7 @@ Section SectionOf(std::string_view name)
     return Section::Other;
 }
 
-}  // namespace
+} // namespace
 
 bool Sections::Read(std::string_view text, ParseError& error)
 {
@@ -234,4 +234,4 @@ bool Sections::ReadStructure(std::string_view buf, ParseError& error)
     return true;
 }
 
-}  // namespace vel::dxf
+} // namespace vel::dxf

@@ -69,4 +69,4 @@ private:
     std::vector<std::size_t> apps_;
 };
 
-}  // namespace vel::dxf
+} // namespace vel::dxf

@@ -10,7 +10,6 @@
 #include <cerrno>
 #include <cstring>
 
-
 namespace vel::dxf {
 
 Source::~Source()
@@ -84,4 +83,4 @@ void Source::Own(std::string content)
     size_ = owned_.size();
 }
 
-}  // namespace vel::dxf
+} // namespace vel::dxf

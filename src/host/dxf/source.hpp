@@ -32,4 +32,4 @@ private:
     std::size_t size_ = 0;
 };
 
-}  // namespace vel::dxf
+} // namespace vel::dxf

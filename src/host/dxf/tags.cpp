@@ -109,11 +109,17 @@ std::size_t FindInvalidUtf8(std::string_view buffer)
         std::uint32_t cp;
         std::uint32_t min;
         if ((b0 & 0xE0) == 0xC0) {
-            len = 2; cp = b0 & 0x1Fu; min = 0x80;
+            len = 2;
+            cp = b0 & 0x1Fu;
+            min = 0x80;
         } else if ((b0 & 0xF0) == 0xE0) {
-            len = 3; cp = b0 & 0x0Fu; min = 0x800;
+            len = 3;
+            cp = b0 & 0x0Fu;
+            min = 0x800;
         } else if ((b0 & 0xF8) == 0xF0) {
-            len = 4; cp = b0 & 0x07u; min = 0x10000;
+            len = 4;
+            cp = b0 & 0x07u;
+            min = 0x10000;
         } else {
             return i;
         }
@@ -131,4 +137,4 @@ std::size_t FindInvalidUtf8(std::string_view buffer)
     return std::string_view::npos;
 }
 
-}  // namespace vel::dxf
+} // namespace vel::dxf

@@ -24,10 +24,8 @@ struct Tag {
 class TagReader {
 public:
     explicit TagReader(std::string_view buffer, std::size_t offset = 0, std::uint32_t line = 1)
-        : begin_(buffer.data()), cur_(buffer.data() + offset), end_(buffer.data() + buffer.size()),
-          line_(line)
-    {
-    }
+        : begin_(buffer.data()), cur_(buffer.data() + offset), end_(buffer.data() + buffer.size()), line_(line)
+    {}
 
     // Reads the next tag; false at the end of the buffer or on a malformed pair (then
     // failed() is true and expected() says what was expected on errorLine()).
@@ -119,4 +117,4 @@ std::uint32_t LineOfOffset(std::string_view buffer, std::size_t offset);
 // First byte offset where the buffer is not valid UTF-8, or npos.
 std::size_t FindInvalidUtf8(std::string_view buffer);
 
-}  // namespace vel::dxf
+} // namespace vel::dxf

@@ -849,7 +849,7 @@ EOF
     return kTemplate;
 }
 
-}  // namespace
+} // namespace
 
 std::unique_ptr<DrawingFile> DrawingFile::New()
 {
@@ -869,4 +869,4 @@ std::unique_ptr<DrawingFile> DrawingFile::New()
     return kTemplate->Copy();
 }
 
-}  // namespace vel::dxf
+} // namespace vel::dxf

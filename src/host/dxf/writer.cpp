@@ -65,4 +65,4 @@ bool DrawingFile::WriteText(const Sink& sink, std::string& error) const
     return true;
 }
 
-}  // namespace vel::dxf
+} // namespace vel::dxf

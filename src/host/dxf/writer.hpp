@@ -82,4 +82,4 @@ private:
     bool ok_ = true;
 };
 
-}  // namespace vel::dxf
+} // namespace vel::dxf

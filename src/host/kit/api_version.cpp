@@ -2,4 +2,7 @@
 // module was built against, which the host checks before it calls anything else.
 #include "velhost/rx.h"
 
-extern "C" __attribute__((visibility("default"))) int acrxGetApiVersion() { return kAcRxApiVersion; }
+extern "C" __attribute__((visibility("default"))) int acrxGetApiVersion()
+{
+    return kAcRxApiVersion;
+}

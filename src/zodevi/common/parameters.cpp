@@ -55,8 +55,7 @@ bool WriteRegistryValue(const char* root, const char* section, const char* value
     return velRegSetValue(root, section, valueName ? valueName : "", value);
 }
 
-bool ReadParameter(const char* file, const char* section, const char* key, const char* defaultValue,
-                   std::string& out)
+bool ReadParameter(const char* file, const char* section, const char* key, const char* defaultValue, std::string& out)
 {
     if (file != nullptr && velIsRegistryRoot(file)) {
         if (defaultValue != nullptr)
@@ -98,7 +97,8 @@ void ReportParameterError(const char* file)
                                 ? "\n" + velFileErrorReason(code) + " : " + velFileErrorAdvice(code) + "."
                                 : std::string();
     if (file == nullptr)
-        MessageBoxText(nullptr, "Pointeur nul pour le fichier de paramètres !\n(Code d'erreur %d)%s", code, why.c_str());
+        MessageBoxText(nullptr, "Pointeur nul pour le fichier de paramètres !\n(Code d'erreur %d)%s", code,
+                       why.c_str());
     else if (name.empty())
         MessageBoxText(nullptr, "Pas de nom pour le fichier de paramètres !\n(Code d'erreur %d)%s", code, why.c_str());
     else if (std::filesystem::exists(name, ec))

@@ -10,8 +10,7 @@ inline constexpr std::size_t kIniReadBufferSize = 4096;
 // Reads a key of an INI file, or a registry value when file is one of the registry root
 // names (the section is then the key path). An INI read always answers true (the default
 // when file, section or key is missing); a registry read answers its success.
-bool ReadParameter(const char* file, const char* section, const char* key, const char* defaultValue,
-                   std::string& out);
+bool ReadParameter(const char* file, const char* section, const char* key, const char* defaultValue, std::string& out);
 
 // Writes a key; a failed INI write is reported once per file (ReportParameterError).
 bool WriteParameter(const char* file, const char* section, const char* key, const char* value);

@@ -57,8 +57,8 @@ bool UpdatePlaning(CZodEVIBdr& bdr, const CZodEVIValueArray<double>& classLimits
     }
     for (const CZodEVIArtTemplate* tmpl : TemplatesOfKind(bdr, 48)) {
         if (!classLimits.IsEmpty())
-            changed |= InstantiateSingleByValue(bdr, *tmpl, classLimits[classLimits.GetSize() - 1], groupKey,
-                                                group, false);
+            changed |=
+                InstantiateSingleByValue(bdr, *tmpl, classLimits[classLimits.GetSize() - 1], groupKey, group, false);
         if (GetPurgeFlag())
             changed |= PurgeByValues(bdr, classLimits, *tmpl, group);
     }

@@ -131,7 +131,8 @@ bool Matches(const std::vector<Piece>& pieces, std::size_t p, std::string_view t
 // True when the key is the pattern between double quotes, placeholders filled.
 bool Fits(const std::vector<Piece>& pieces, std::string_view key)
 {
-    return key.size() >= 2 && key.front() == '"' && key.back() == '"' && Matches(pieces, 0, key.substr(1, key.size() - 2));
+    return key.size() >= 2 && key.front() == '"' && key.back() == '"' &&
+           Matches(pieces, 0, key.substr(1, key.size() - 2));
 }
 
 bool HasPlaceholder(const std::vector<Piece>& pieces)
@@ -249,8 +250,8 @@ CZodEVIArticle* MakeArticle(CZodEVIBdr& bdr, const CZodEVIArtTemplate& tmpl, con
     article->quantityKey = std::move(quantityKey);
     article->description = std::move(description);
     article->groupKey = groupKey;
-    article->treePath = MakeTreePath(category ? *category : target.DefaultCategory(texts, tmpl.nature),
-                                     article->code, article->designation);
+    article->treePath = MakeTreePath(category ? *category : target.DefaultCategory(texts, tmpl.nature), article->code,
+                                     article->designation);
     article->metreInt4 = 0;
     CZodEVIArticle* added = bdr.AddArticle(std::move(article));
     group.push_back(added);
@@ -314,13 +315,12 @@ bool InstantiateByName(CZodEVIBdr& bdr, int networkIndex, const std::string& net
                        const CZodEVIArtTemplate& tmpl, const std::string& name, const std::string& groupKey,
                        CZodEVIGroup& group, bool newGroup)
 {
-    return Instantiate(bdr, tmpl, NetworkTarget(networkIndex, networkName), NameFill(name), groupKey, group,
-                       newGroup);
+    return Instantiate(bdr, tmpl, NetworkTarget(networkIndex, networkName), NameFill(name), groupKey, group, newGroup);
 }
 
 bool InstantiateByValue(CZodEVIBdr& bdr, int networkIndex, const std::string& networkName,
-                        const CZodEVIArtTemplate& tmpl, double value, const std::string& groupKey,
-                        CZodEVIGroup& group, bool newGroup)
+                        const CZodEVIArtTemplate& tmpl, double value, const std::string& groupKey, CZodEVIGroup& group,
+                        bool newGroup)
 {
     return Instantiate(bdr, tmpl, NetworkTarget(networkIndex, networkName), ValueFill(value), groupKey, group,
                        newGroup);
@@ -330,8 +330,8 @@ bool InstantiateByValues(CZodEVIBdr& bdr, int networkIndex, const std::string& n
                          const CZodEVIArtTemplate& tmpl, double lower, double upper, const std::string& groupKey,
                          CZodEVIGroup& group, bool newGroup)
 {
-    return Instantiate(bdr, tmpl, NetworkTarget(networkIndex, networkName), PairFill(lower, upper), groupKey,
-                       group, newGroup);
+    return Instantiate(bdr, tmpl, NetworkTarget(networkIndex, networkName), PairFill(lower, upper), groupKey, group,
+                       newGroup);
 }
 
 bool InstantiateSingleByName(CZodEVIBdr& bdr, const CZodEVIArtTemplate& tmpl, const std::string& name,
@@ -398,14 +398,14 @@ std::vector<const CZodEVIArtTemplate*> TemplatesOfKind(const CZodEVIBdr& bdr, in
     return templates;
 }
 
-bool InstantiateFixed(CZodEVIBdr& bdr, int networkIndex, const std::string& networkName,
-                      const CZodEVIArtTemplate& tmpl, const std::string& groupKey, CZodEVIGroup& group)
+bool InstantiateFixed(CZodEVIBdr& bdr, int networkIndex, const std::string& networkName, const CZodEVIArtTemplate& tmpl,
+                      const std::string& groupKey, CZodEVIGroup& group)
 {
     const Target target = NetworkTarget(networkIndex, networkName);
     const CZodEVIArtParam* texts = target.Texts(tmpl);
     if (texts == nullptr)
         return false;
-    MakeArticle(bdr, tmpl, target, *texts, MakeQuantityKey(tmpl.codePattern), texts->designation,
-                texts->description, std::nullopt, groupKey, group);
+    MakeArticle(bdr, tmpl, target, *texts, MakeQuantityKey(tmpl.codePattern), texts->designation, texts->description,
+                std::nullopt, groupKey, group);
     return true;
 }

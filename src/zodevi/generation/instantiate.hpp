@@ -24,8 +24,8 @@ bool InstantiateByName(CZodEVIBdr& bdr, int networkIndex, const std::string& net
                        const CZodEVIArtTemplate& tmpl, const std::string& name, const std::string& groupKey,
                        CZodEVIGroup& group, bool newGroup);
 bool InstantiateByValue(CZodEVIBdr& bdr, int networkIndex, const std::string& networkName,
-                        const CZodEVIArtTemplate& tmpl, double value, const std::string& groupKey,
-                        CZodEVIGroup& group, bool newGroup);
+                        const CZodEVIArtTemplate& tmpl, double value, const std::string& groupKey, CZodEVIGroup& group,
+                        bool newGroup);
 bool InstantiateByValues(CZodEVIBdr& bdr, int networkIndex, const std::string& networkName,
                          const CZodEVIArtTemplate& tmpl, double lower, double upper, const std::string& groupKey,
                          CZodEVIGroup& group, bool newGroup);
@@ -33,8 +33,8 @@ bool InstantiateByValues(CZodEVIBdr& bdr, int networkIndex, const std::string& n
 // A fixed article of a new network group: texts and code pattern taken as they stand,
 // filed under the template's own category; no search for an existing article. False
 // when the template has no texts for the network.
-bool InstantiateFixed(CZodEVIBdr& bdr, int networkIndex, const std::string& networkName,
-                      const CZodEVIArtTemplate& tmpl, const std::string& groupKey, CZodEVIGroup& group);
+bool InstantiateFixed(CZodEVIBdr& bdr, int networkIndex, const std::string& networkName, const CZodEVIArtTemplate& tmpl,
+                      const std::string& groupKey, CZodEVIGroup& group);
 
 // Articles of single templates (comb ducts, road projects): the template's one text,
 // its category as it stands, codes from its prefix only.

@@ -20,8 +20,7 @@ bool IsPairKind(int kind)
 
 // Every template of each kind, one article per name, then that template's purge.
 bool ApplyNames(CZodEVIBdr& bdr, int networkIndex, const std::string& networkName, std::initializer_list<int> kinds,
-                const std::vector<std::string>& names, const std::string& groupKey, CZodEVIGroup& group,
-                bool newGroup)
+                const std::vector<std::string>& names, const std::string& groupKey, CZodEVIGroup& group, bool newGroup)
 {
     bool changed = false;
     for (int kind : kinds) {
@@ -35,9 +34,9 @@ bool ApplyNames(CZodEVIBdr& bdr, int networkIndex, const std::string& networkNam
     return changed;
 }
 
-bool ApplyDepthBounds(CZodEVIBdr& bdr, int networkIndex, const std::string& networkName,
-                      const std::vector<int>& kinds, const CZodEVIValueArray<double>& bounds,
-                      const std::string& groupKey, CZodEVIGroup& group, bool newGroup)
+bool ApplyDepthBounds(CZodEVIBdr& bdr, int networkIndex, const std::string& networkName, const std::vector<int>& kinds,
+                      const CZodEVIValueArray<double>& bounds, const std::string& groupKey, CZodEVIGroup& group,
+                      bool newGroup)
 {
     if (bounds.IsEmpty())
         return false;
@@ -48,8 +47,8 @@ bool ApplyDepthBounds(CZodEVIBdr& bdr, int networkIndex, const std::string& netw
         for (const CZodEVIArtTemplate* tmpl : TemplatesOfKind(bdr, kind)) {
             if (IsPairKind(kind)) {
                 for (const auto& [lower, upper] : pairs)
-                    changed |= InstantiateByValues(bdr, networkIndex, networkName, *tmpl, lower, upper, groupKey,
-                                                   group, newGroup);
+                    changed |= InstantiateByValues(bdr, networkIndex, networkName, *tmpl, lower, upper, groupKey, group,
+                                                   newGroup);
                 if (GetPurgeFlag())
                     changed |= PurgeByValuePairs(bdr, pairs, *tmpl, group);
             } else {
@@ -90,8 +89,8 @@ bool UpdateNetwork(CZodEVIBdr& bdr, int networkIndex, const std::string& network
     };
     names({23, 24}, models);
     names({19}, materials);
-    changed |= ApplyDepthBounds(bdr, networkIndex, networkName, {21, 22, 8, 9, 35, 36}, depthBounds, groupKey,
-                                group, newGroup);
+    changed |= ApplyDepthBounds(bdr, networkIndex, networkName, {21, 22, 8, 9, 35, 36}, depthBounds, groupKey, group,
+                                newGroup);
     names({26}, fittings);
     names({25}, pipeSupplies);
     names({27}, fittingSupplies);
@@ -115,8 +114,8 @@ bool UpdateDepthClasses(CZodEVIBdr& bdr, const CZodEVIValueArray<double>& depthB
             continue;
         // Branch trenches exist for EP and EU networks only.
         const bool branches = *networkIndex == 0 || *networkIndex == 1;
-        const std::vector<int> kinds = branches ? std::vector<int>{21, 22, 8, 9, 35, 36}
-                                                : std::vector<int>{21, 22, 8, 9};
+        const std::vector<int> kinds =
+            branches ? std::vector<int>{21, 22, 8, 9, 35, 36} : std::vector<int>{21, 22, 8, 9};
         changed |= ApplyDepthBounds(bdr, *networkIndex, *networkName, kinds, depthBounds, groupKey, *group, false);
     }
     return changed;

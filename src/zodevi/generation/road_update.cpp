@@ -32,8 +32,7 @@ bool UpdateCombDucts(CZodEVIBdr& bdr, const std::vector<std::string>& models)
 }
 
 bool UpdateMaterials(CZodEVIBdr& bdr, const std::vector<std::string>& volumeMaterials,
-                     const std::vector<std::string>& surfaceMaterials,
-                     const std::vector<std::string>& lengthMaterials)
+                     const std::vector<std::string>& surfaceMaterials, const std::vector<std::string>& lengthMaterials)
 {
     const std::string groupKey = MakeRoadGroupKey();
     CZodEVIGroup& group = *bdr.GroupOf(groupKey, true);

@@ -15,5 +15,4 @@ bool UpdateCombDucts(CZodEVIBdr& bdr, const std::vector<std::string>& models);
 // surface article per material of the surface list, one length article per material of
 // the length list; true when an article was created or removed.
 bool UpdateMaterials(CZodEVIBdr& bdr, const std::vector<std::string>& volumeMaterials,
-                     const std::vector<std::string>& surfaceMaterials,
-                     const std::vector<std::string>& lengthMaterials);
+                     const std::vector<std::string>& surfaceMaterials, const std::vector<std::string>& lengthMaterials);

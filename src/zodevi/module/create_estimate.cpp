@@ -27,7 +27,8 @@ std::string ChooseEstimateName(const std::vector<std::string>& existing)
 
 void CreateEstimateCommand()
 {
-    MainServices()->ShowInfo("permet de créer un métré (devis, quantitatifs...etc) à partir des données des modules VRD");
+    MainServices()->ShowInfo(
+        "permet de créer un métré (devis, quantitatifs...etc) à partir des données des modules VRD");
     CommandSettingsScope settings(false);
     sibling::Rsx_WriteXDataMetres();
 

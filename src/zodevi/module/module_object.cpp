@@ -117,8 +117,8 @@ int CVelSrvModul::Init()
 {
     appPath = acedGetAppName();
     if (!acrxServiceIsRegistered(kVelMainServicesName)) {
-        const std::string text = FormatPattern(Message(505), {moduleName}) + Message(506) + "\n" + Message(507) +
-                                 "\n" + Message(508);
+        const std::string text =
+            FormatPattern(Message(505), {moduleName}) + Message(506) + "\n" + Message(507) + "\n" + Message(508);
         MessageBoxFlags(nullptr, MB_ICONERROR, "%s", text.c_str());
         return 0;
     }

@@ -79,9 +79,8 @@ ZODEVI_EXPORT std::int32_t ZodEVI_WriteBdr()
 ZODEVI_EXPORT std::int32_t ZodEVI_UpdateBdrRsx(const std::int32_t* networkIndex, const std::string* networkName,
                                                const CZodEVIStringList* models, const CZodEVIStringList* pipeSupplies,
                                                const CZodEVIStringList* fittings,
-                                               const CZodEVIStringList* fittingSupplies,
-                                               const CZodEVIStringList* ducts, const CZodEVIStringList* materials,
-                                               const CZodEVIRealArray* depthBounds)
+                                               const CZodEVIStringList* fittingSupplies, const CZodEVIStringList* ducts,
+                                               const CZodEVIStringList* materials, const CZodEVIRealArray* depthBounds)
 {
     if (g_current == nullptr || networkIndex == nullptr || networkName == nullptr || models == nullptr ||
         pipeSupplies == nullptr || fittings == nullptr || fittingSupplies == nullptr || ducts == nullptr ||
@@ -92,7 +91,8 @@ ZODEVI_EXPORT std::int32_t ZodEVI_UpdateBdrRsx(const std::int32_t* networkIndex,
     return Apply([index, name = *networkName, models = *models, pipeSupplies = *pipeSupplies, fittings = *fittings,
                   fittingSupplies = *fittingSupplies, ducts = *ducts, materials = *materials,
                   bounds = FiniteValues(*depthBounds)](CZodEVIBdr& bdr) {
-        return UpdateNetwork(bdr, index, name, models, pipeSupplies, fittings, fittingSupplies, ducts, materials, bounds);
+        return UpdateNetwork(bdr, index, name, models, pipeSupplies, fittings, fittingSupplies, ducts, materials,
+                             bounds);
     });
 }
 
@@ -116,8 +116,8 @@ ZODEVI_EXPORT std::int32_t ZodEVI_UpdateBdrMat(const CZodEVIStringList* volumeMa
 {
     if (g_current == nullptr || volumeMaterials == nullptr || surfaceMaterials == nullptr || lengthMaterials == nullptr)
         return kZodEVIFailed;
-    return Apply([volumes = *volumeMaterials, surfaces = *surfaceMaterials,
-                  lengths = *lengthMaterials](CZodEVIBdr& bdr) { return UpdateMaterials(bdr, volumes, surfaces, lengths); });
+    return Apply([volumes = *volumeMaterials, surfaces = *surfaceMaterials, lengths = *lengthMaterials](
+                     CZodEVIBdr& bdr) { return UpdateMaterials(bdr, volumes, surfaces, lengths); });
 }
 
 ZODEVI_EXPORT std::int32_t ZodEVI_UpdateBdrEpDcp(const CZodEVIRealArray* thicknesses)
@@ -141,8 +141,8 @@ ZODEVI_EXPORT std::int32_t ZodEVI_UpdateBdrEpRbt(const CZodEVIRealArray* classLi
     return Apply([limits = FiniteValues(*classLimits)](CZodEVIBdr& bdr) { return UpdatePlaning(bdr, limits); });
 }
 
-ZODEVI_EXPORT std::int32_t ZodEVI_GetBdrPrice(const std::int32_t* selector, const std::string* itemName,
-                                              double* price, std::string networkName)
+ZODEVI_EXPORT std::int32_t ZodEVI_GetBdrPrice(const std::int32_t* selector, const std::string* itemName, double* price,
+                                              std::string networkName)
 {
     if (price != nullptr)
         *price = 0;

@@ -31,8 +31,7 @@ CVelMainServices* MainServices();
 // Calls the function a sibling exports under symbol, as a function of type Fn; answers
 // 1 without calling when the function cannot be found, else the function's answer.
 template <class Fn, class... Args>
-std::int32_t CallSiblingFunction(const char* moduleFile, const char* serviceName, const char* symbol,
-                                 Args&&... args)
+std::int32_t CallSiblingFunction(const char* moduleFile, const char* serviceName, const char* symbol, Args&&... args)
 {
     void* address = GetServiceSymbol(moduleFile, serviceName, symbol);
     if (address == nullptr)

@@ -11,7 +11,7 @@
 // The texts of a template for one network index.
 class CZodEVIArtParam {
 public:
-    std::string designation;     // may hold placeholders filled by the generators
+    std::string designation; // may hold placeholders filled by the generators
     std::string description;
     std::string categoryPattern; // network templates hold one "%s" for the network name
     std::string numberingPrefix; // "GC", "TP", a network prefix, or empty
@@ -28,8 +28,8 @@ public:
     void Reset();
     // One text under index 0.
     void SetSingle(int kind, int nature, const std::string& codePattern, const std::string& unit,
-                   const std::string& designation, const std::string& description,
-                   const std::string& categoryPattern, const std::string& numberingPrefix);
+                   const std::string& designation, const std::string& description, const std::string& categoryPattern,
+                   const std::string& numberingPrefix);
     // The same texts under indices 0 to 12, each description after its network sentence.
     void SetPerNetwork(int kind, int nature, const std::string& codePattern, const std::string& unit,
                        const std::string& designation, const std::string& description,

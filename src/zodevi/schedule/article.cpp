@@ -13,31 +13,32 @@ constexpr std::string_view kNetworkPrefix = "PRJ_RES(";
 std::string MakeNatureLevel(int nature)
 {
     switch (nature) {
-    case kNaturePoint: return "\\\\Ponctuel";
-    case kNatureLinear: return "\\\\Linéaire";
-    case kNatureSurface: return "\\\\Surfacique";
-    case kNatureVolume: return "\\\\Volumique";
-    case kNatureText: return "\\\\Textuel";
-    case kNatureNonGraphic: return "\\\\Non Graphique";
-    default: return {};
+    case kNaturePoint:
+        return "\\\\Ponctuel";
+    case kNatureLinear:
+        return "\\\\Linéaire";
+    case kNatureSurface:
+        return "\\\\Surfacique";
+    case kNatureVolume:
+        return "\\\\Volumique";
+    case kNatureText:
+        return "\\\\Textuel";
+    case kNatureNonGraphic:
+        return "\\\\Non Graphique";
+    default:
+        return {};
     }
 }
 
 std::string NetworkSentence(int networkIndex)
 {
     static const char* const sentences[] = {
-        "Article associé aux réseaux EP.\r\n",
-        "Article associé aux réseaux EU.\r\n",
-        "Article associé aux réseaux AEP.\r\n",
-        "Article associé aux réseaux GAZ.\r\n",
-        "Article associé aux réseaux BTA.\r\n",
-        "Article associé aux réseaux BTB.\r\n",
-        "Article associé aux réseaux HTA.\r\n",
-        "Article associé aux réseaux HTB.\r\n",
-        "Article associé aux réseaux 'Téléphone'.\r\n",
-        "Article associé aux réseaux 'Télévision'.\r\n",
-        "Article associé aux réseaux 'Eclairage'.\r\n",
-        "Article associé aux réseaux 'Chauffage'.\r\n",
+        "Article associé aux réseaux EP.\r\n",          "Article associé aux réseaux EU.\r\n",
+        "Article associé aux réseaux AEP.\r\n",         "Article associé aux réseaux GAZ.\r\n",
+        "Article associé aux réseaux BTA.\r\n",         "Article associé aux réseaux BTB.\r\n",
+        "Article associé aux réseaux HTA.\r\n",         "Article associé aux réseaux HTB.\r\n",
+        "Article associé aux réseaux 'Téléphone'.\r\n", "Article associé aux réseaux 'Télévision'.\r\n",
+        "Article associé aux réseaux 'Eclairage'.\r\n", "Article associé aux réseaux 'Chauffage'.\r\n",
     };
     if (networkIndex < 0 || networkIndex >= static_cast<int>(std::size(sentences)))
         return {};
@@ -100,8 +101,7 @@ std::optional<std::string> NetworkNameOfKey(std::string_view groupKey)
 bool IsRoadGroupKey(std::string_view groupKey)
 {
     return groupKey.find("PRJ_PFM()") != std::string_view::npos ||
-           groupKey.find("PRJ_RTE()") != std::string_view::npos ||
-           groupKey.find("PRJ_PCV()") != std::string_view::npos;
+           groupKey.find("PRJ_RTE()") != std::string_view::npos || groupKey.find("PRJ_PCV()") != std::string_view::npos;
 }
 
 bool IsAssociatedKey(std::string_view groupKey)

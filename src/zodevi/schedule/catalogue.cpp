@@ -22,6 +22,8 @@ struct NetworkColumns {
     const char* supply; // null where the network has no supply articles
 };
 
+// The tables stay one row per line.
+// clang-format off
 // Indexed by network index.
 const NetworkColumns kNetworks[kNetworkIndexCount] = {
     {"EP", R"(%s\\Canalisation EP)", R"(%s\\Regard EP)", nullptr},
@@ -156,6 +158,7 @@ const Row kCatalogue[] = {
     {49, 4, "PRJ_VOL_RPF_%s", "m³", "Volume de reprofilage de %s", VEL_ROAD_KORVANE "Volume de reprofilage utilisé pour le matériau %s", kExistingRoads, "GC", F, Range::Single, {}},
     {50, 2, "PRJ_SCI_LIN_3D", "ml", "Sciage de chaussée", VEL_ROAD_KORVANE "Longueur 3D totale de découpe de chaussée par sciage.", kExistingRoads, "GC", F, Range::Single, {}},
 };
+// clang-format on
 
 #undef VEL_ROAD_ALL
 #undef VEL_ROAD_LINEAR
@@ -180,19 +183,26 @@ bool ListsIndex(std::string_view list, int index)
 bool InRange(Range range, int index)
 {
     switch (range) {
-    case Range::EpEu: return index <= 1;
-    case Range::From2: return index >= 2;
-    default: return true;
+    case Range::EpEu:
+        return index <= 1;
+    case Range::From2:
+        return index >= 2;
+    default:
+        return true;
     }
 }
 
 const char* CategoryOf(const Row& row, int index)
 {
     switch (row.family) {
-    case Family::Pipe: return kNetworks[index].pipe;
-    case Family::Fitting: return kNetworks[index].fitting;
-    case Family::Supply: return kNetworks[index].supply;
-    default: return row.category;
+    case Family::Pipe:
+        return kNetworks[index].pipe;
+    case Family::Fitting:
+        return kNetworks[index].fitting;
+    case Family::Supply:
+        return kNetworks[index].supply;
+    default:
+        return row.category;
     }
 }
 
@@ -225,11 +235,11 @@ void FillStandardCatalogue(CZodEVIArtTemplateArray& catalogue)
     for (const Row& row : kCatalogue) {
         const bool uniform = row.family == Family::Fixed && row.variants.size() == 0;
         if (row.range == Range::Single) {
-            work.SetSingle(row.kind, row.nature, row.code, row.unit, row.designation, row.description,
-                           row.category, row.prefix);
+            work.SetSingle(row.kind, row.nature, row.code, row.unit, row.designation, row.description, row.category,
+                           row.prefix);
         } else if (row.range == Range::All && uniform) {
-            work.SetPerNetwork(row.kind, row.nature, row.code, row.unit, row.designation, row.description,
-                               row.category, row.prefix);
+            work.SetPerNetwork(row.kind, row.nature, row.code, row.unit, row.designation, row.description, row.category,
+                               row.prefix);
         } else {
             // Only the indexes of the range get texts: the others stay absent, so the
             // template never applies to those networks.

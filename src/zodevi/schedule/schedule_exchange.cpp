@@ -18,9 +18,9 @@ namespace {
 constexpr const char* kNoArticleMessage = "ERREUR : aucun article ne se réfère à l'élément !";
 
 const char* const kSelectorPatterns[] = {
-    "RSX_TUY_LIN_3D_%s", "RSX_TUY_NB_%s",      "RSX_FRX_LIN_3D_%s",      "RSX_FRX_NB_%s",     "RSX_PGN_LIN_3D_%s",
-    "RSX_PGN_NB_%s",     "RSX_SBL_NB_%s",      "RSX_TUY_FRNT_LIN_3D_%s", "RSX_SBL_FRNT_NB_%s", "PRJ_VOL_MAT_%s",
-    "PRJ_SFC_MAT_%s",    "PRJ_LIN_MAT_%s",     "PRJ_TON_MAT_%s",
+    "RSX_TUY_LIN_3D_%s", "RSX_TUY_NB_%s",  "RSX_FRX_LIN_3D_%s",      "RSX_FRX_NB_%s",      "RSX_PGN_LIN_3D_%s",
+    "RSX_PGN_NB_%s",     "RSX_SBL_NB_%s",  "RSX_TUY_FRNT_LIN_3D_%s", "RSX_SBL_FRNT_NB_%s", "PRJ_VOL_MAT_%s",
+    "PRJ_SFC_MAT_%s",    "PRJ_LIN_MAT_%s", "PRJ_TON_MAT_%s",
 };
 
 std::string QuantityKeyOf(int selector, const std::string& item)

@@ -258,7 +258,8 @@ std::size_t CZodEVIBdr::RemoveArticles(const std::vector<const CZodEVIArticle*>&
     for (const auto& entry : groups)
         entry.second->RemoveIf([&](const CZodEVIArticle* a) { return doomed.count(a) != 0; });
     ForgetHighestNumber();
-    return std::erase_if(articles, [&](const std::unique_ptr<CZodEVIArticle>& a) { return doomed.count(a.get()) != 0; });
+    return std::erase_if(articles,
+                         [&](const std::unique_ptr<CZodEVIArticle>& a) { return doomed.count(a.get()) != 0; });
 }
 
 bool CZodEVIBdr::AddEditedArticle(const CZodEVIArticle& article)

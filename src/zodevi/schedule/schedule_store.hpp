@@ -27,8 +27,8 @@ public:
     // Path of the user's parameter file; empty when unknown.
     virtual std::string ParameterFile() = 0;
     // Value of a key of the parameter file, or the default.
-    virtual std::string ReadParameter(const std::string& file, const std::string& section,
-                                      const std::string& key, const std::string& defaultValue) = 0;
+    virtual std::string ReadParameter(const std::string& file, const std::string& section, const std::string& key,
+                                      const std::string& defaultValue) = 0;
     // Full path of a data file found for a location code; empty when not found.
     virtual std::string FindDataFile(const std::string& name, int locationCode) = 0;
     // A data folder for a folder code, ending with its separator; may be empty.
@@ -60,8 +60,7 @@ public:
     std::string NewCode(const std::string& prefix, const CZodEVIGroup* group) const;
     CZodEVIFound FindInGroupByQuantityKey(const std::string& quantityKey, const CZodEVIGroup* group) const;
     CZodEVIFound FindByTreePath(const std::string& treePath) const;
-    bool FindCategoryByQuantityKeyPart(const std::string& text, const CZodEVIGroup* group,
-                                       std::string& category) const;
+    bool FindCategoryByQuantityKeyPart(const std::string& text, const CZodEVIGroup* group, std::string& category) const;
     int ArticlesInCategory(const std::string& category, CZodEVIArticleList& out) const;
     int SubCategories(const std::string& category, std::vector<std::string>& out) const;
     // Network name -> group, in group order.

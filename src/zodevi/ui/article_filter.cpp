@@ -13,8 +13,8 @@ bool IsDroppedLevel(std::string_view level)
 {
     // Case folding keeps a letter's UTF-8 length, so a level of another length is
     // none of them: most levels are told apart without folding.
-    for (std::string_view nature : {std::string_view("Linéaire"), std::string_view("Ponctuel"),
-                                    std::string_view("Non Graphique")})
+    for (std::string_view nature :
+         {std::string_view("Linéaire"), std::string_view("Ponctuel"), std::string_view("Non Graphique")})
         if (level.size() == nature.size() && EqualsNoCase(level, nature))
             return true;
     return false;
@@ -100,8 +100,7 @@ const std::vector<std::string>& CZodEVIFilterEntryArray::SubLevels(const std::ve
     return node ? node->subLevels : kNoLevels;
 }
 
-const std::vector<CZodEVIFilterEntry*>& CZodEVIFilterEntryArray::EntriesAt(
-    const std::vector<std::string>& path) const
+const std::vector<CZodEVIFilterEntry*>& CZodEVIFilterEntryArray::EntriesAt(const std::vector<std::string>& path) const
 {
     const LevelNode* node = NodeOf(path);
     return node ? node->entries : kNoEntries;
@@ -183,7 +182,8 @@ void AddArticleQuantity(CZodEVIFilterEntryArray& entries, CZodEVIArticle* articl
         entries.Add(article, entries.ProjectId(kind, project), project, quantity, kind);
 }
 
-void SortEntries(CZodEVIFilterEntryArray& entries, const std::unordered_map<const CZodEVIArticle*, std::size_t>& positions)
+void SortEntries(CZodEVIFilterEntryArray& entries,
+                 const std::unordered_map<const CZodEVIArticle*, std::size_t>& positions)
 {
     // Full-width positions, and entries the schedule does not hold first: the order a
     // pass of adjacent swaps would give, in O(n log n).
@@ -228,8 +228,8 @@ double EntryTotal(const CZodEVIFilterEntry& entry)
     return total;
 }
 
-bool BuildLines(const CZodEVIFilterEntry& entry, std::vector<std::unique_ptr<CZodEVIAssocLine>>& lines,
-                double& total, const CZodEVIArticle*& article, bool perProject)
+bool BuildLines(const CZodEVIFilterEntry& entry, std::vector<std::unique_ptr<CZodEVIAssocLine>>& lines, double& total,
+                const CZodEVIArticle*& article, bool perProject)
 {
     lines.clear();
     total = 0;
@@ -310,12 +310,14 @@ void CollectEntries(const CZodEVIFilterInputs& in, CZodEVIFilterEntryArray& entr
 {
     // Every hash map walked here (project maps, tables) iterates in the order of first
     // insertion, so a rebuild always gives the same order.
-    bool roadChecked = AddCheckedProjects(in.projects.roadProjects, in.checkedRoadProjects, in.roadKeys,
-                                          velproj::kKindRoad, entries);
+    bool roadChecked =
+        AddCheckedProjects(in.projects.roadProjects, in.checkedRoadProjects, in.roadKeys, velproj::kKindRoad, entries);
     roadChecked = AddCheckedProjects(in.projects.korvaneProjects, in.checkedKorvaneProjects, in.roadKeys,
-                                     velproj::kKindKorvane, entries) || roadChecked;
-    roadChecked = AddCheckedProjects(in.projects.platforms, in.checkedPlatforms, in.roadKeys,
-                                     velproj::kKindPlatform, entries) || roadChecked;
+                                     velproj::kKindKorvane, entries) ||
+                  roadChecked;
+    roadChecked =
+        AddCheckedProjects(in.projects.platforms, in.checkedPlatforms, in.roadKeys, velproj::kKindPlatform, entries) ||
+        roadChecked;
     if (roadChecked && in.roadArticles != nullptr)
         for (CZodEVIArticle* article : *in.roadArticles)
             if (article->nature == kNatureNonGraphic)
@@ -339,8 +341,9 @@ void CollectEntries(const CZodEVIFilterInputs& in, CZodEVIFilterEntryArray& entr
                 ++group;
             if (group == in.networkGroups->size())
                 continue;
-            const CZodEVIArticleKeyIndex* keys =
-                in.networkKeys != nullptr && group < in.networkKeys->size() ? &(*in.networkKeys)[group].second : nullptr;
+            const CZodEVIArticleKeyIndex* keys = in.networkKeys != nullptr && group < in.networkKeys->size()
+                                                     ? &(*in.networkKeys)[group].second
+                                                     : nullptr;
             const std::size_t id = entries.ProjectId(kProjectNetwork, project);
             if (keys != nullptr)
                 for (const auto& [key, quantity] : table->Entries())

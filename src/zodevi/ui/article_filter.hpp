@@ -24,7 +24,7 @@ struct CZodEVIEntryProject {
     std::string name;
     int kind = 0;
     double quantity = 0;
-    std::size_t id = 0;  // the project's number in its entry array
+    std::size_t id = 0; // the project's number in its entry array
 };
 
 // One article present in the filter. A project is known by its kind and its name
@@ -122,8 +122,8 @@ double EntryTotal(const CZodEVIFilterEntry& entry);
 
 // The estimate lines of one entry: one line with the sum of its quantities, or one line
 // per project. Each line also carries its projects with their kinds (assocText1).
-bool BuildLines(const CZodEVIFilterEntry& entry, std::vector<std::unique_ptr<CZodEVIAssocLine>>& lines,
-                double& total, const CZodEVIArticle*& article, bool perProject);
+bool BuildLines(const CZodEVIFilterEntry& entry, std::vector<std::unique_ptr<CZodEVIAssocLine>>& lines, double& total,
+                const CZodEVIArticle*& article, bool perProject);
 
 // Which names of a project group are checked: name -> the project's own name, or for a
 // network project the network's name.

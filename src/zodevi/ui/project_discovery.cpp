@@ -6,11 +6,16 @@
 CZodEVIProjectMap* CZodEVIProjectMaps::OfKind(int kind) const
 {
     switch (kind) {
-    case velproj::kKindNetwork: return networks;
-    case velproj::kKindRoad: return roadProjects;
-    case velproj::kKindKorvane: return korvaneProjects;
-    case velproj::kKindPlatform: return platforms;
-    default: return nullptr;
+    case velproj::kKindNetwork:
+        return networks;
+    case velproj::kKindRoad:
+        return roadProjects;
+    case velproj::kKindKorvane:
+        return korvaneProjects;
+    case velproj::kKindPlatform:
+        return platforms;
+    default:
+        return nullptr;
     }
 }
 

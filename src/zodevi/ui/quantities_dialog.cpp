@@ -50,12 +50,27 @@ VelDialogTemplate MetExpArtTemplate()
     t.controls = {
         {IDC_TREE_PROJECTS, K::kTree, "Projets", {7, 10, 119, 250}, false, true, "projet"},
         {IDC_TREE_ARTICLES, K::kTree, "Articles", {135, 10, 286, 250}, false, true, "article"},
-        {IDC_GROUP_MODE, K::kGroupBox, "Article comptant les quantités de plusieurs projets", {7, 265, 251, 45}, false,
-         false, ""},
-        {IDC_RADIO_SUM, K::kRadio, "Afficher la somme des quantités dans l'article", {13, 280, 240, 10}, true, true,
+        {IDC_GROUP_MODE,
+         K::kGroupBox,
+         "Article comptant les quantités de plusieurs projets",
+         {7, 265, 251, 45},
+         false,
+         false,
+         ""},
+        {IDC_RADIO_SUM,
+         K::kRadio,
+         "Afficher la somme des quantités dans l'article",
+         {13, 280, 240, 10},
+         true,
+         true,
          "mode somme"},
-        {IDC_RADIO_DETAIL, K::kRadio, "Détailler les quantités de chaque projet en sous-articles (=> sous-totaux)",
-         {13, 295, 240, 10}, false, false, "mode détail"},
+        {IDC_RADIO_DETAIL,
+         K::kRadio,
+         "Détailler les quantités de chaque projet en sous-articles (=> sous-totaux)",
+         {13, 295, 240, 10},
+         false,
+         false,
+         "mode détail"},
         {IDOK, K::kButton, "Valider", {271, 292, 70, 17}, false, true, "valider"},
         {IDCANCEL, K::kButton, "Quitter", {351, 292, 70, 17}, false, true, "quitter"},
     };
@@ -209,8 +224,8 @@ void DlgMetExpArt::SetItemState(SECTreeCtrl& tree, HTREEITEM item, int state)
 void DlgMetExpArt::FillProjectTree(int state)
 {
     m_treeProjects.DeleteAllItems();
-    for (CZodEVIGroupSelection* selection : {&m_networkSelection, &m_roadSelection, &m_korvaneSelection,
-                                             &m_platformSelection})
+    for (CZodEVIGroupSelection* selection :
+         {&m_networkSelection, &m_roadSelection, &m_korvaneSelection, &m_platformSelection})
         selection->Clear();
 
     const struct {
@@ -489,8 +504,8 @@ void DlgMetExpArt::OnClick(SECTreeCtrl& tree, long* result)
 
 void DlgMetExpArt::UpdateGroupSelection(HTREEITEM item)
 {
-    for (CZodEVIGroupSelection* selection : {&m_networkSelection, &m_roadSelection, &m_korvaneSelection,
-                                             &m_platformSelection}) {
+    for (CZodEVIGroupSelection* selection :
+         {&m_networkSelection, &m_roadSelection, &m_korvaneSelection, &m_platformSelection}) {
         const auto found = selection->itemNames.find(item);
         if (found == selection->itemNames.end())
             continue;

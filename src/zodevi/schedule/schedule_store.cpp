@@ -7,6 +7,7 @@
 
 #include <algorithm>
 #include <climits>
+#include <cstdint>
 #include <filesystem>
 #include <unordered_set>
 
@@ -91,15 +92,17 @@ int CZodEVIBdr::NextFreeNumber() const
     // Usually every number is below the counter.
     if (highestNumber < nextNumber)
         return nextNumber;
-    std::unordered_set<int> taken;
-    taken.reserve(articles.size());
-    for (const auto& article : articles)
-        if (article->number >= nextNumber)
-            taken.insert(article->number);
-    int n = nextNumber;
-    while (taken.count(n) != 0)
-        ++n;
-    return n;
+    // With k articles, one of nextNumber .. nextNumber + k is free: only those are marked.
+    std::vector<bool> taken(articles.size() + 1);
+    for (const auto& article : articles) {
+        const std::int64_t offset = std::int64_t{article->number} - nextNumber;
+        if (offset >= 0 && offset < static_cast<std::int64_t>(taken.size()))
+            taken[static_cast<std::size_t>(offset)] = true;
+    }
+    std::size_t free = 0;
+    while (taken[free])
+        ++free;
+    return nextNumber + static_cast<int>(free);
 }
 
 int CZodEVIBdr::TakeNextNumber()

@@ -20,14 +20,6 @@ namespace {
 
 using vel::dxf::FormatHandle;
 
-std::string Slurp(const std::string& path)
-{
-    std::ifstream in(path, std::ios::binary);
-    std::stringstream ss;
-    ss << in.rdbuf();
-    return ss.str();
-}
-
 std::string Fixture(const char* name)
 {
     return std::string(VEL_TEST_DATA) + "/dxf/" + name;
@@ -71,7 +63,7 @@ TEST(Drawing, FixturesReadAndWriteBackByteForByte)
         EXPECT_EQ(db->layerName(db->clayer()), c.clayer);
         EXPECT_EQ(db->layerNames().size(), c.layers);
         EXPECT_FALSE(db->isModified());
-        EXPECT_EQ(Written(*db), Slurp(Fixture(c.file)));
+        EXPECT_EQ(Written(*db), ReadFile(Fixture(c.file)));
     }
 }
 
@@ -97,7 +89,6 @@ TEST(Drawing, OmittedHeaderVariablesTakeDefaultsAndAreAddedOnceSet)
     ASSERT_EQ(db->setLimcheck(false), Acad::eOk);
     EXPECT_TRUE(db->isModified());
     std::unique_ptr<AcDbDatabase> back;
-    std::string error;
     ASSERT_EQ(velReadDrawing(Written(*db), "copie.dxf", back).description(), "");
     EXPECT_EQ(back->osmode(), 512);
     EXPECT_FALSE(back->limcheck());
@@ -126,7 +117,6 @@ TEST(Drawing, NewObjectsGetHandlesBelowTheSeedAndTheirApplicationIsRegistered)
             EXPECT_NE(text.find("NOUVELLE_APP\r\n"), std::string::npos);
         }
         std::unique_ptr<AcDbDatabase> back;
-        std::string error;
         ASSERT_EQ(velReadDrawing(text, file, back).description(), "");
         EXPECT_TRUE(back->isRegApp("NOUVELLE_APP"));
         const vel::dxf::Sections& records = back->file().records();
@@ -162,7 +152,6 @@ TEST(Drawing, TextOfOlderFilesIsWrittenInTheirCodePage)
     const std::string text = Written(*db);
     EXPECT_NE(text.find("\n  8\nCalque \\U+03A9 \xE9\n"), std::string::npos);
     std::unique_ptr<AcDbDatabase> back;
-    std::string error;
     ASSERT_EQ(velReadDrawing(text, "copie.dxf", back).description(), "");
     EXPECT_EQ(back->layerName(back->clayer()), "Calque Ω é");
 }
@@ -176,7 +165,6 @@ TEST(Drawing, R12DrawingsHoldNoDictionaries)
     ASSERT_EQ(db->addLayer("NOUVEAU", layer), Acad::eOk);
     ASSERT_EQ(db->addRegApp("APP_R12"), Acad::eOk);
     std::unique_ptr<AcDbDatabase> back;
-    std::string error;
     ASSERT_EQ(velReadDrawing(Written(*db), "r12.dxf", back).description(), "");
     EXPECT_EQ(back->getLayerId("nouveau", layer), Acad::eOk);
     EXPECT_TRUE(back->isRegApp("APP_R12"));
@@ -283,7 +271,6 @@ TEST(Drawing, ASeedLeftTooLowIsRaisedOnlyWhenSomethingIsWritten)
 {
     const std::string text = Replace(Sound(), "$HANDSEED\n  5\nFF", "$HANDSEED\n  5\n2");
     std::unique_ptr<AcDbDatabase> db;
-    std::string error;
     ASSERT_EQ(velReadDrawing(text, "graine.dxf", db).description(), "");
     EXPECT_EQ(Written(*db), text);
     AcDbDictionary* nod = nullptr;
@@ -321,7 +308,6 @@ TEST(Drawing, DuplicateHandlesFoundHoweverShuffled)
         const std::string sound = Replace(Sound(), "  0\nENDSEC\n  0\nSECTION\n  2\nOBJECTS",
                                           lines + "  0\nENDSEC\n  0\nSECTION\n  2\nOBJECTS");
         std::unique_ptr<AcDbDatabase> db;
-        std::string error;
         ASSERT_EQ(velReadDrawing(sound, "lignes.dxf", db).description(), "");
         EXPECT_FALSE(db->idFromHandle(0x101).isNull());
         const std::string twice = Replace(sound, "  5\n102\n", "  5\n" + FormatHandle(0x100 + count) + "\n");
@@ -336,7 +322,6 @@ TEST(Drawing, HandlesUseAll64Bits)
 {
     const std::string text = Replace(Sound(), "  0\nLINE\n  5\n20\n", "  0\nLINE\n  5\nfffffffffffffffe\n");
     std::unique_ptr<AcDbDatabase> db;
-    std::string error;
     ASSERT_EQ(velReadDrawing(text, "grand.dxf", db).description(), "");
     AcDbObject* line = nullptr;
     ASSERT_EQ(db->openObject(line, db->idFromHandle(0xFFFFFFFFFFFFFFFEULL), AcDb::kForRead), Acad::eOk);
@@ -366,7 +351,6 @@ TEST(Drawing, BinaryDrawingsAreWrittenBackInBinary)
         const std::string bytes = Written(*db);
         EXPECT_EQ(bytes.substr(0, 22), std::string_view("AutoCAD Binary DXF\r\n\x1a\0", 22));
         std::unique_ptr<AcDbDatabase> back;
-        std::string error;
         ASSERT_EQ(velReadDrawing(bytes, file, back).description(), "");
         EXPECT_EQ(back->layerName(back->clayer()), "BINAIRE");
         EXPECT_EQ(back->dxfVersion(), db->dxfVersion());
@@ -375,7 +359,7 @@ TEST(Drawing, BinaryDrawingsAreWrittenBackInBinary)
 
 TEST(Drawing, MalformedBinaryDrawingsNameTheGroup)
 {
-    const std::string good = Slurp(Fixture("r2018_bin.dxf"));
+    const std::string good = ReadFile(Fixture("r2018_bin.dxf"));
     std::string spoiled = good;
     spoiled.replace(24, 7, "SECTIOX");
     // Values the text form could not give back bit for bit are refused.
@@ -421,7 +405,7 @@ TEST(Drawing, OpenAndSaveReportFileErrors)
 TEST(Drawing, SaveThatFailsAnywhereLeavesThePreviousDrawing)
 {
     TempDir dir;
-    const std::string original = Slurp(Fixture("r2018.dxf"));
+    const std::string original = ReadFile(Fixture("r2018.dxf"));
     const std::string path = dir.File("plan.dxf");
     std::unique_ptr<AcDbDatabase> db;
     std::string error;
@@ -445,7 +429,7 @@ TEST(Drawing, SaveThatFailsAnywhereLeavesThePreviousDrawing)
                 return;
             }
             EXPECT_FALSE(saved);
-            EXPECT_EQ(Slurp(path), original);
+            EXPECT_EQ(ReadFile(path), original);
             EXPECT_EQ(error.rfind("Fichier « " + path +
                                       " » non enregistré : " + velFileErrorReason(FileFaults::ErrorOf(run.failed)),
                                   0),
@@ -460,7 +444,7 @@ TEST(Drawing, SaveThatFailsAnywhereLeavesThePreviousDrawing)
 TEST(Drawing, FileCutShortWhileOpenDoesNotReachTheDrawing)
 {
     TempDir dir;
-    const std::string original = Slurp(Fixture("r2018.dxf"));
+    const std::string original = ReadFile(Fixture("r2018.dxf"));
     const std::string path = dir.Write("plan.dxf", original);
     auto db = Open(path);
     ASSERT_NE(db, nullptr);

@@ -3,6 +3,8 @@
 // find the same header, layers, dictionaries, XData and entities, with only the change.
 #include <gtest/gtest.h>
 
+#include "support/temp_dir.hpp"
+
 #include <algorithm>
 #include <cstdio>
 #include <fstream>
@@ -30,14 +32,6 @@ std::set<std::string> Dump(const std::string& path)
     for (std::string line; std::getline(in, line);)
         lines.insert(line);
     return lines;
-}
-
-std::string Slurp(const std::string& path)
-{
-    std::ifstream in(path, std::ios::binary);
-    std::stringstream ss;
-    ss << in.rdbuf();
-    return ss.str();
 }
 
 std::vector<std::string> Minus(const std::set<std::string>& a, const std::set<std::string>& b)
@@ -122,8 +116,8 @@ TEST(EzdxfRoundTrip, UnknownEntitiesAndObjectsAreKeptByteForByte)
     ASSERT_EQ(velOpenDrawing(original, db).description(), "");
     ChangeProject(*db);
     ASSERT_TRUE(velSaveDrawing(*db, saved, error)) << error;
-    const std::string before = Slurp(original);
-    const std::string after = Slurp(saved);
+    const std::string before = ReadFile(original);
+    const std::string after = ReadFile(saved);
     for (const char* type : {"VEL_CHOSE", "VEL_OBJET"}) {
         SCOPED_TRACE(type);
         const auto begin = before.find(std::string("  0\n") + type);

@@ -13,6 +13,8 @@ TEST(GetKword, AnswersTheGlobalKeyword)
         const char* typed;
         int status;
         const char* result;
+        int flags = 0;
+        const char* shown = "";
     };
     const Case cases[] = {
         {"Oui\n", RTNORM, "Yes"},
@@ -27,25 +29,17 @@ TEST(GetKword, AnswersTheGlobalKeyword)
         {"Nonne\nOui\n", RTNORM, "Yes"},
         {"^C\n", RTCAN, "inchangé"},
         {"", RTCAN, "inchangé"},
+        {"\n\nNon\n", RTNORM, "No", RSG_NONULL, "Une réponse est requise."},
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.typed);
         ScriptedSession session(c.typed);
-        acedInitGet(0, "Oui Non _ Yes No");
+        acedInitGet(c.flags, "Oui Non _ Yes No");
         std::string result = "inchangé";
         EXPECT_EQ(acedGetKword("Continuer ? ", result), c.status);
         EXPECT_EQ(result, c.result);
+        EXPECT_NE(session.Output().find(c.shown), std::string::npos) << session.Output();
     }
-}
-
-TEST(GetKword, RefusedEmptyAnswerAsksAgain)
-{
-    ScriptedSession session("\n\nNon\n");
-    acedInitGet(RSG_NONULL, "Oui Non _ Yes No");
-    std::string result;
-    EXPECT_EQ(acedGetKword("Q ? ", result), RTNORM);
-    EXPECT_EQ(result, "No");
-    EXPECT_NE(session.Output().find("Une réponse est requise."), std::string::npos);
 }
 
 TEST(GetKword, InitGetHoldsForOneCallOnly)

@@ -4,9 +4,9 @@
 #include <gtest/gtest.h>
 
 #include <filesystem>
-#include <fstream>
 
 #include "support/session.hpp"
+#include "support/temp_dir.hpp"
 #include "velhost/commands.h"
 #include "velhost/documents.h"
 #include "velhost/profile.h"
@@ -31,11 +31,14 @@ protected:
 
 TEST_F(DynamicLinker, LoadFailuresSayWhichStepFailed)
 {
+    const TempDir dir;
+    const std::string bogus = dir.Write("vel_bogus_module.arx", "pas une bibliothèque");
     struct Case {
-        const char* name;
-        const char* expected;
+        std::string name;
+        std::string expected;
     };
     const Case cases[] = {
+        {bogus, "Impossible d'ouvrir le module " + bogus},
         {"absent_module.arx", "Impossible de trouver le module absent_module.arx."},
         {"entryless_module.arx", "n'exporte pas de point d'entrée acrxEntryPoint"},
         {"refusing_module.arx", "a refusé de démarrer (réponse 3)"},
@@ -46,7 +49,7 @@ TEST_F(DynamicLinker, LoadFailuresSayWhichStepFailed)
     for (const Case& c : cases) {
         SCOPED_TRACE(c.name);
         session.ClearOutput();
-        EXPECT_FALSE(acrxLoadModule(c.name, false));
+        EXPECT_FALSE(acrxLoadModule(c.name.c_str(), false));
         EXPECT_NE(session.Output().find(c.expected), std::string::npos) << session.Output();
         // A module of another release is never started.
         EXPECT_EQ(session.Output().find("entry point called"), std::string::npos);
@@ -54,17 +57,6 @@ TEST_F(DynamicLinker, LoadFailuresSayWhichStepFailed)
     EXPECT_TRUE(velLoadedModules().empty());
     // What the refusing module registered before refusing went with it.
     EXPECT_FALSE(acrxServiceIsRegistered("VelTestRefusingService"));
-}
-
-TEST_F(DynamicLinker, NotASharedLibraryIsReported)
-{
-    const std::string bogus = (std::filesystem::temp_directory_path() / "vel_bogus_module.arx").string();
-    {
-        std::ofstream(bogus) << "pas une bibliothèque";
-    }
-    EXPECT_FALSE(acrxLoadModule(bogus.c_str(), false));
-    EXPECT_NE(session.Output().find("Impossible d'ouvrir le module " + bogus), std::string::npos);
-    std::filesystem::remove(bogus);
 }
 
 TEST_F(DynamicLinker, ServiceSymbolsComeFromTheRegisteringModule)

@@ -2,6 +2,7 @@
 // module's exchange, the currency, and an estimate listed afterwards.
 #include "schedule/schedule_exchange.hpp"
 
+#include "support/schedule.hpp"
 #include "support/temp_dir.hpp"
 #include "module/service_api.hpp"
 #include "module/siblings.hpp"
@@ -51,16 +52,15 @@ TEST_F(MetreModule, ScheduleGoesThroughTheModuleFile)
     EXPECT_FALSE(Read(bdr));
     EXPECT_NE(output.str().find("Bordereau « " + bdr.path + " » : fichier introuvable."), std::string::npos)
         << output.str();
-    auto article = std::make_unique<CZodEVIArticle>();
-    article->code = "EU-001";
-    article->designation = "Tuyau « PVC »";
-    article->description = "Ligne 1\r\nLigne 2";
-    article->quantityKey = "\"RSX_TUY_LIN_3D_PVC 200\"";
-    article->groupKey = "PRJ_RES(EU1)";
-    article->treePath = "Réseaux\\\\EU1\\\\Linéaire\\\\EU-001 - Tuyau « PVC »";
-    article->unitPrice = 12345.67;
-    article->metreText7 = "champ du métré";
-    bdr.AddArticle(std::move(article));
+    bdr.AddArticle(std::make_unique<CZodEVIArticle>(
+        CZodEVIArticle{.code = "EU-001",
+                       .unitPrice = 12345.67,
+                       .designation = "Tuyau « PVC »",
+                       .quantityKey = "\"RSX_TUY_LIN_3D_PVC 200\"",
+                       .description = "Ligne 1\r\nLigne 2",
+                       .groupKey = "PRJ_RES(EU1)",
+                       .metreText7 = "champ du métré",
+                       .treePath = "Réseaux\\\\EU1\\\\Linéaire\\\\EU-001 - Tuyau « PVC »"}));
     ASSERT_TRUE(Write(bdr));
 
     ASSERT_TRUE(Read(bdr));
@@ -81,12 +81,10 @@ TEST_F(MetreModule, ScheduleGoesThroughTheModuleFile)
 
 TEST_F(MetreModule, ScriptedEditorIsMirroredInTheStore)
 {
-    auto article = std::make_unique<CZodEVIArticle>();
-    article->code = "EU-001";
-    article->designation = "Tuyau";
-    article->groupKey = "PRJ_RES(EU1)";
-    article->treePath = "Réseaux\\\\EU1\\\\Linéaire\\\\EU-001 - Tuyau";
-    bdr.GroupOf("PRJ_RES(EU1)", true)->push_back(bdr.AddArticle(std::move(article)));
+    AddFiled(bdr, {.code = "EU-001",
+                   .designation = "Tuyau",
+                   .groupKey = "PRJ_RES(EU1)",
+                   .treePath = "Réseaux\\\\EU1\\\\Linéaire\\\\EU-001 - Tuyau"});
     ASSERT_TRUE(Write(bdr));
     script.str("ajouter Réseaux\\\\EU1\\\\Linéaire\\\\EU-002 - Tuyau fonte\n"
                "champ unitPrice Réseaux\\\\EU1\\\\Linéaire\\\\EU-002 - Tuyau fonte\n"
@@ -105,10 +103,7 @@ TEST_F(MetreModule, ScriptedEditorIsMirroredInTheStore)
 
 TEST_F(MetreModule, ConfigPageKeepsTheScheduleWhenTheChosenFileNoLongerReads)
 {
-    auto article = std::make_unique<CZodEVIArticle>();
-    article->code = "EU-001";
-    article->treePath = "Réseaux\\\\EU1\\\\Linéaire\\\\EU-001 - Tuyau";
-    bdr.AddArticle(std::move(article));
+    AddFiled(bdr, {.code = "EU-001", .treePath = "Réseaux\\\\EU1\\\\Linéaire\\\\EU-001 - Tuyau"});
     ASSERT_TRUE(Write(bdr));
     ASSERT_TRUE(Read(bdr));
     const std::size_t articles = bdr.Articles().size();
@@ -134,13 +129,13 @@ TEST_F(MetreModule, CurrencyAndEstimates)
     ASSERT_EQ(sibling::VtMetre_SymbMonetaire(&currency), 0);
     EXPECT_EQ(currency, "CHF");
 
+    // No schedule remembered by the module: the estimate looks for one itself.
     acDocManager->createDocument(nullptr, dir.File("plan.dxf"));
-    CZodEVIAssocLine line;
-    line.label = "Essais";
-    line.lineKind = 5;
-    line.projects = "**Forfait";
-    line.treePath = "Divers\\\\DV-001 - Essais";
-    line.unitPrice = 250;
+    CZodEVIAssocLine line{.label = "Essais",
+                          .lineKind = 5,
+                          .projects = "**Forfait",
+                          .treePath = "Divers\\\\DV-001 - Essais",
+                          .unitPrice = 250};
     std::vector<CZodEVIAssocLine*> lines{&line};
     EXPECT_EQ(CallMetre<VtMetre_AfficherAssocFn>("VtMetre_AfficherAssoc", std::string("Devis"), &lines, 1, 0), 0)
         << output.str();

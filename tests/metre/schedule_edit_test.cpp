@@ -28,15 +28,13 @@ ArticleVector Schedule()
     ArticleVector articles;
     for (const auto& [code, designation, path, nature] :
          {std::tuple{"EU-001", "Tuyau", kTuyau, 2}, std::tuple{"EU-002", "Regard", kRegard, 1}}) {
-        auto a = std::make_unique<CZodEVIArticle>();
-        a->code = code;
-        a->designation = designation;
-        a->treePath = path;
-        a->nature = nature;
-        a->groupKey = "PRJ_RES(EU1)";
-        a->description = "Ligne 1\r\nLigne 2";
-        a->unitPrice = 12.5;
-        articles.push_back(std::move(a));
+        articles.push_back(std::make_unique<CZodEVIArticle>(CZodEVIArticle{.code = code,
+                                                                           .unitPrice = 12.5,
+                                                                           .nature = nature,
+                                                                           .designation = designation,
+                                                                           .description = "Ligne 1\r\nLigne 2",
+                                                                           .groupKey = "PRJ_RES(EU1)",
+                                                                           .treePath = path}));
     }
     return articles;
 }

@@ -277,6 +277,9 @@ TEST_F(ModuleApi, UnreadableScheduleIsNeverWrittenOver)
     const std::string cut = whole.substr(0, whole.size() / 2);
     dir.Write("profil/Donnees/VelaBordereau.xml", cut);
     Reload();
+    // The module may come back at another address: its functions are looked up again.
+    write = Function<ZodEVI_WriteBdrFn>("ZodEVI_WriteBdr");
+    show = Function<ZodEVI_ShowBdrPriceFn>("ZodEVI_ShowBdrPrice");
     session.ClearOutput();
 
     // Updates still run in memory; nothing reaches the file, each time with the reason.

@@ -110,18 +110,6 @@ TEST_F(ModuleObject, CommandListSortsHyphensAndPutsItsOwnCommandFirst)
     }
 }
 
-TEST_F(ModuleObject, ListedLinesUseTheMainServicesFormat)
-{
-    for (const char* name : {"VelVuzazORE15", "ZodEVIBdrPrix", "-Zoom"})
-        acedRegCmds()->addCommand(kZodEVICommandGroup, name, name, 0, &Nothing);
-    CVelSrvModul module;
-    module.ListGroupCommands(kZodEVICommandGroup, "%s : %-*.*s  %s\n", nullptr);
-    EXPECT_NE(session.Output().find(" \nVelVuzazORE15 : ZodEVIBdrPrix  ZodEVIBdrPrix\n"
-                                    "VelVuzazORE15 : -Zoom          -Zoom\n"),
-              std::string::npos)
-        << session.Output();
-}
-
 TEST_F(ModuleObject, StartsAndStopsThroughTheHost)
 {
     // In the module, building the schedule has loaded the main services by now.

@@ -70,33 +70,14 @@ VelRbPtr RecordOf(AcDbDatabase& database, const std::string& project)
 
 std::uint32_t ProjectCount(AcDbDatabase& database)
 {
-    AcDbDictionary* named = nullptr;
-    AcDbObject* networks = nullptr;
-    AcDbObject* projects = nullptr;
     std::uint32_t count = 0;
-    database.getNamedObjectsDictionary(named, AcDb::kForRead);
-    if (named->getAt(kNetworksDictionary, networks, AcDb::kForRead) == Acad::eOk) {
-        if (static_cast<AcDbDictionary*>(networks)->getAt(kProjectsDictionary, projects, AcDb::kForRead) == Acad::eOk) {
-            count = static_cast<AcDbDictionary*>(projects)->numEntries();
-            projects->close();
-        }
-        networks->close();
-    }
-    named->close();
+    velproj::ForEachProjectRecord(&database, [&](auto kind, auto&&...) { count += kind == velproj::kKindNetwork; });
     return count;
 }
 
-std::string Tagged(const char* name, int index, const char* project, const char* kind, const char* model,
-                   std::vector<double> depths = {})
+std::string Tagged(const char* network, int index, const char* project, const char* kind, const char* model)
 {
-    XData x;
-    x.network = name;
-    x.index = index;
-    x.project = project;
-    x.kind = kind;
-    x.model = model;
-    x.depths = std::move(depths);
-    return x.Text();
+    return XData{.network = network, .index = index, .project = project, .kind = kind, .model = model}.Text();
 }
 
 } // namespace

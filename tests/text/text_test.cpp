@@ -150,10 +150,6 @@ TEST(JoinStrings, Separators)
     EXPECT_EQ(JoinStrings({"a", "b", "c"}, ", "), "a, b, c");
 }
 
-} // namespace
-
-namespace {
-
 TEST(FormatPattern, FillsOnlyWhatItIsGiven)
 {
     struct Case {

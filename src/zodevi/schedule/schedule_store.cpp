@@ -10,6 +10,8 @@
 #include <filesystem>
 #include <unordered_set>
 
+namespace zodevi {
+
 namespace {
 
 CZodEVIBdrEnvironment* g_environment = nullptr;
@@ -370,3 +372,5 @@ const int* CZodEVIBdr::NetworkIndexOf(const std::string& groupKey) const
 {
     return networkIndexes.Find(groupKey);
 }
+
+} // namespace zodevi

@@ -9,6 +9,8 @@
 
 #include <string>
 
+using namespace zodevi;
+
 namespace {
 
 constexpr int kArticles = 10000;

@@ -19,6 +19,8 @@
 #include <malloc.h>
 #include <unistd.h>
 
+using namespace zodevi;
+
 namespace {
 
 namespace fs = std::filesystem;

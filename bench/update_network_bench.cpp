@@ -13,6 +13,8 @@
 #include <string>
 #include <vector>
 
+using namespace zodevi;
+
 namespace {
 
 constexpr int kArticlesPerFillerNetwork = 500;

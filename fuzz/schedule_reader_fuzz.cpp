@@ -57,13 +57,13 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
 {
     const std::string_view text(reinterpret_cast<const char*>(data), size);
     metre::ArticleVector read;
-    const metre::FileResult result = metre::ReadScheduleText(text, "fuzz.xml", read);
+    const VelReadResult result = metre::ReadScheduleText(text, "fuzz.xml", read);
 
     metre::ArticleVector direct, document;
     direct.push_back(std::make_unique<CZodEVIArticle>());
     const bool directRead = metre::ReadScheduleDirectly(text, direct);
-    const metre::FileResult byDocument = metre::ReadScheduleDocument(text, "fuzz.xml", document);
-    if (result.ok != byDocument.ok || result.message != byDocument.message)
+    const VelReadResult byDocument = metre::ReadScheduleDocument(text, "fuzz.xml", document);
+    if (result.status != byDocument.status || result.line != byDocument.line || result.message != byDocument.message)
         Fault("réponse différente de la lecture du document : « " + result.message + " » au lieu de « " +
               byDocument.message + " »");
     if (directRead) {
@@ -91,7 +91,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     metre::ArticleVector back, backDirect;
     if (!metre::ReadScheduleDirectly(written, backDirect))
         Fault("texte écrit refusé par la lecture directe");
-    const metre::FileResult again = metre::ReadScheduleText(written, "fuzz2.xml", back);
+    const VelReadResult again = metre::ReadScheduleText(written, "fuzz2.xml", back);
     if (!again)
         Fault("relecture refusée : " + again.message);
     if (back.size() != read.size())

@@ -540,7 +540,7 @@ std::string EstimateCsv(const Estimate& estimate)
     return out;
 }
 
-FileResult WriteEstimateCsv(const std::string& path, const Estimate& estimate)
+VelReadResult WriteEstimateCsv(const std::string& path, const Estimate& estimate)
 {
     return WriteFileAtomically(path, EstimateCsv(estimate), false);
 }
@@ -943,11 +943,12 @@ void WriteSourcesSheet(lxw_worksheet* sheet, const Estimate& estimate, const Est
 
 } // namespace
 
-FileResult WriteWorkbookFile(const std::string& file, const Estimate& estimate, const std::string& currency)
+VelReadResult WriteWorkbookFile(const std::string& file, const Estimate& estimate, const std::string& currency)
 {
     lxw_workbook* workbook = workbook_new(file.c_str());
     if (workbook == nullptr)
-        return FileResult::Failure(FormatString("Classeur « %s » : création impossible.", file.c_str()));
+        return VelReadResult::Failed(VelReadStatus::kCannotWrite, file, 0,
+                                     FormatString("Classeur « %s » : création impossible.", file.c_str()));
     const Formats formats = MakeFormats(workbook, currency);
     lxw_worksheet* estimateSheet = workbook_add_worksheet(workbook, "Devis");
     lxw_worksheet* summarySheet = workbook_add_worksheet(workbook, kSummarySheet);
@@ -965,29 +966,32 @@ FileResult WriteWorkbookFile(const std::string& file, const Estimate& estimate, 
     const lxw_error closed = workbook_close(workbook);
     const int closeError = errno;
     if (closed != LXW_NO_ERROR)
-        return FileResult::Failure(FormatString(
-            "Classeur « %s » non enregistré : %s ; rien n'est remplacé ; %s.", file.c_str(),
-            closeError != 0 ? velFileErrorReason(closeError).c_str() : "la bibliothèque des classeurs a échoué",
-            closeError != 0 ? velFileErrorAdvice(closeError).c_str() : "recommencez"));
+        return VelReadResult::Failed(
+            VelReadStatus::kCannotWrite, file, closeError,
+            FormatString("Classeur « %s » non enregistré : %s ; rien n'est remplacé ; %s.", file.c_str(),
+                         closeError != 0 ? velFileErrorReason(closeError).c_str()
+                                         : "la bibliothèque des classeurs a échoué",
+                         closeError != 0 ? velFileErrorAdvice(closeError).c_str() : "recommencez"));
     return {};
 }
 
-FileResult WriteEstimateWorkbook(const std::string& path, const Estimate& estimate, const std::string& currency)
+VelReadResult WriteEstimateWorkbook(const std::string& path, const Estimate& estimate, const std::string& currency)
 {
     // The library writes to a name: it is given the writer's temporary file.
     VelAtomicFile file(path);
     if (VelFileResult opened = file.open(); !opened)
-        return FileResult::Failure(opened.message);
-    if (FileResult written = WriteWorkbookFile(file.temporaryPath(), estimate, currency); !written) {
+        return VelReadResult::Failed(VelReadStatus::kCannotWrite, path, opened.error, opened.message);
+    if (VelReadResult written = WriteWorkbookFile(file.temporaryPath(), estimate, currency); !written) {
         // The message names the file the user asked for, not the temporary one.
         const std::string& temporary = file.temporaryPath();
         if (const std::size_t at = written.message.find(temporary); at != std::string::npos)
             written.message.replace(at, temporary.size(), path);
+        written.file = path;
         return written;
     }
     VelFileResult committed = file.commit();
     if (!committed)
-        return FileResult::Failure(committed.message);
+        return VelReadResult::Failed(VelReadStatus::kCannotWrite, path, committed.error, committed.message);
     if (!committed.message.empty())
         acutPrintf("%s\n", committed.message.c_str());
     return {};

@@ -108,10 +108,10 @@ std::string EstimateCsv(const Estimate& estimate);
 // The workbook: the estimate (the same rows as the CSV, live formulas carrying their
 // computed values, ready to print), its summary by chapter with a chart, the lines to
 // check, and where each line's quantity comes from. Written at exactly `file`.
-FileResult WriteWorkbookFile(const std::string& file, const Estimate& estimate, const std::string& currency);
+VelReadResult WriteWorkbookFile(const std::string& file, const Estimate& estimate, const std::string& currency);
 
 // Replace `path` with the workbook or the CSV once written whole.
-FileResult WriteEstimateWorkbook(const std::string& path, const Estimate& estimate, const std::string& currency);
-FileResult WriteEstimateCsv(const std::string& path, const Estimate& estimate);
+VelReadResult WriteEstimateWorkbook(const std::string& path, const Estimate& estimate, const std::string& currency);
+VelReadResult WriteEstimateCsv(const std::string& path, const Estimate& estimate);
 
 } // namespace metre

@@ -75,8 +75,8 @@ int FillArticles(const std::string& path, std::vector<CZodEVIArticle*>* table)
     if (table == nullptr)
         return 2;
     ArticleVector articles;
-    if (FileResult read = ReadScheduleFile(path, articles); !read) {
-        acutPrintf("%s\n", read.message.c_str());
+    if (VelReadResult read = ReadScheduleFile(path, articles); !read) {
+        acutPrintf("%s\n", read.description().c_str());
         return 1;
     }
     RememberSchedulePath(path);
@@ -91,8 +91,8 @@ int ExportArticles(const std::string& path, const std::vector<CZodEVIArticle*>* 
     if (table == nullptr)
         return 2;
     const std::vector<const CZodEVIArticle*> articles(table->begin(), table->end());
-    if (FileResult written = WriteScheduleFile(path, articles); !written) {
-        acutPrintf("%s\n", written.message.c_str());
+    if (VelReadResult written = WriteScheduleFile(path, articles); !written) {
+        acutPrintf("%s\n", written.description().c_str());
         return 1;
     }
     RememberSchedulePath(path);
@@ -118,8 +118,9 @@ int ShowEstimate(const std::string& name, const std::vector<CZodEVIAssocLine*>* 
 
     ArticleVector schedule;
     const std::string schedulePath = EstimateSchedulePath();
-    if (FileResult read = ReadScheduleFile(schedulePath, schedule); !read)
-        acutPrintf("Devis « %s » : %s Les taux de TVA sont pris à 19,6 %%.\n", name.c_str(), read.message.c_str());
+    if (VelReadResult read = ReadScheduleFile(schedulePath, schedule); !read)
+        acutPrintf("Devis « %s » : %s Les taux de TVA sont pris à 19,6 %%.\n", name.c_str(),
+                   read.description().c_str());
 
     const ProjectTables projects = ProjectTables::Read(*database);
     Estimate estimate = BuildEstimate(name, lines ? *lines : std::vector<CZodEVIAssocLine*>(), projects, schedule);
@@ -129,10 +130,10 @@ int ShowEstimate(const std::string& name, const std::vector<CZodEVIAssocLine*>* 
     const std::string currency = CurrencySymbol();
     const std::string workbook = (folder / (name + ".xlsx")).string();
     const std::string csv = (folder / (name + ".csv")).string();
-    for (const FileResult& written :
+    for (const VelReadResult& written :
          {WriteEstimateWorkbook(workbook, estimate, currency), WriteEstimateCsv(csv, estimate)}) {
         if (!written) {
-            acutPrintf("Devis « %s » : %s\n", name.c_str(), written.message.c_str());
+            acutPrintf("Devis « %s » : %s\n", name.c_str(), written.description().c_str());
             return 1;
         }
     }

@@ -119,8 +119,8 @@ bool WriteSession(const std::string& path, VelFileIdentity opened, const Schedul
             }
             now = velFileIdentity(path);
             if (opened.sameContent(now)) {
-                if (FileResult written = WriteScheduleFile(path, result); !written) {
-                    acutPrintf("%s\n", written.message.c_str());
+                if (VelReadResult written = WriteScheduleFile(path, result); !written) {
+                    acutPrintf("%s\n", written.description().c_str());
                     return false;
                 }
                 return true;
@@ -149,8 +149,8 @@ bool WriteSession(const std::string& path, VelFileIdentity opened, const Schedul
         }
         ArticleVector fresh;
         opened = velFileIdentity(path);
-        if (FileResult read = ReadScheduleFile(path, fresh); !read) {
-            acutPrintf("%s\nBordereau « %s » : rien n'est enregistré.\n", read.message.c_str(), path.c_str());
+        if (VelReadResult read = ReadScheduleFile(path, fresh); !read) {
+            acutPrintf("%s\nBordereau « %s » : rien n'est enregistré.\n", read.description().c_str(), path.c_str());
             return false;
         }
         newer = Rebase(edit.Original(), std::move(fresh), changes);
@@ -324,8 +324,8 @@ int EditScheduleFile(const std::string& path, const std::string& treePath, std::
         return 2;
     const VelFileIdentity opened = velFileIdentity(path);
     ArticleVector articles;
-    if (FileResult read = ReadScheduleFile(path, articles); !read) {
-        acutPrintf("%s\n", read.message.c_str());
+    if (VelReadResult read = ReadScheduleFile(path, articles); !read) {
+        acutPrintf("%s\n", read.description().c_str());
         return 2;
     }
     ScheduleEdit edit(articles);

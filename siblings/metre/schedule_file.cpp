@@ -690,27 +690,35 @@ private:
 
 // Parses `buffer` in place (pugixml writes into it) and appends its articles to `out`
 // when all of it reads. Messages count lines in `text`, the buffer as it was.
-FileResult ParseArticles(char* buffer, std::size_t size, std::string_view text, const std::string& name,
-                         ArticleVector& out)
+VelReadResult ParseArticles(char* buffer, std::size_t size, std::string_view text, const std::string& name,
+                            ArticleVector& out)
 {
     pugi::xml_document document;
     const pugi::xml_parse_result parsed =
         document.load_buffer_inplace(buffer, size, pugi::parse_minimal | pugi::parse_escapes);
-    if (!parsed)
-        return FileResult::Failure(FormatString("Bordereau « %s », ligne %d : %s.", name.c_str(),
-                                                LineOfOffset(text, parsed.offset), ParseProblem(parsed).c_str()));
+    if (!parsed) {
+        const int line = LineOfOffset(text, parsed.offset);
+        return VelReadResult::Malformed(
+            name, line, "du XML bien formé",
+            FormatString("Bordereau « %s », ligne %d : %s.", name.c_str(), line, ParseProblem(parsed).c_str()));
+    }
     const pugi::xml_node root = document.document_element();
-    if (std::strcmp(root.name(), kScheduleRoot) != 0)
-        return FileResult::Failure(
+    if (std::strcmp(root.name(), kScheduleRoot) != 0) {
+        const int line = LineOfOffset(text, root.offset_debug());
+        return VelReadResult::Malformed(
+            name, line, FormatString("l'élément racine <%s>", kScheduleRoot),
             FormatString("Bordereau « %s », ligne %d : élément racine <%s> attendu, <%s> trouvé ; "
                          "ce fichier n'est pas un bordereau.",
-                         name.c_str(), LineOfOffset(text, root.offset_debug()), kScheduleRoot, root.name()));
+                         name.c_str(), line, kScheduleRoot, root.name()));
+    }
     // Articles past the end of the root would be lost at the next write.
-    if (const pugi::xml_node other = root.next_sibling())
-        return FileResult::Failure(FormatString("Bordereau « %s », ligne %d : élément <%s> après la fin de <%s> ; un "
-                                                "bordereau n'a qu'un élément racine.",
-                                                name.c_str(), LineOfOffset(text, other.offset_debug()), other.name(),
-                                                kScheduleRoot));
+    if (const pugi::xml_node other = root.next_sibling()) {
+        const int line = LineOfOffset(text, other.offset_debug());
+        return VelReadResult::Malformed(name, line, FormatString("la fin du fichier après </%s>", kScheduleRoot),
+                                        FormatString("Bordereau « %s », ligne %d : élément <%s> après la fin de <%s> ; "
+                                                     "un bordereau n'a qu'un élément racine.",
+                                                     name.c_str(), line, other.name(), kScheduleRoot));
+    }
     const auto& fields = ArticleFields();
     const auto& packedNames = PackedNames();
     const std::string_view parsedText(buffer, size);
@@ -718,11 +726,15 @@ FileResult ParseArticles(char* buffer, std::size_t size, std::string_view text, 
     for (pugi::xml_node node = root.first_child(); node; node = node.next_sibling()) {
         // Counting lines is only worth it for a message: it would make reading quadratic.
         const auto lineOf = [&] { return LineOfOffset(text, node.offset_debug()); };
-        if (node.type() != pugi::node_element || std::strcmp(node.name(), kScheduleArticle) != 0)
-            return FileResult::Failure(FormatString(
-                "Bordereau « %s », ligne %d : élément <%s> attendu, %s trouvé.", name.c_str(), lineOf(),
-                kScheduleArticle,
-                node.type() == pugi::node_element ? FormatString("<%s>", node.name()).c_str() : "du texte"));
+        if (node.type() != pugi::node_element || std::strcmp(node.name(), kScheduleArticle) != 0) {
+            const int line = lineOf();
+            return VelReadResult::Malformed(
+                name, line, FormatString("un élément <%s>", kScheduleArticle),
+                FormatString("Bordereau « %s », ligne %d : élément <%s> attendu, %s trouvé.", name.c_str(), line,
+                             kScheduleArticle,
+                             node.type() == pugi::node_element ? FormatString("<%s>", node.name()).c_str()
+                                                               : "du texte"));
+        }
         auto article = std::make_unique<CZodEVIArticle>();
         std::uint64_t seen = 0;
         std::size_t expected = 0;
@@ -733,27 +745,38 @@ FileResult ParseArticles(char* buffer, std::size_t size, std::string_view text, 
             if (*attributeName == '\0')
                 break;
             const std::size_t position = FieldOf(attributeName, expected, parsedText, fields, packedNames);
-            if (position == fields.size())
-                return FileResult::Failure(
-                    FormatString("Bordereau « %s », ligne %d : article %zu, champ inconnu « %s ».", name.c_str(),
-                                 lineOf(), read.size() + 1, attributeName));
-            if (seen & (std::uint64_t{1} << position))
-                return FileResult::Failure(
+            if (position == fields.size()) {
+                const int line = lineOf();
+                return VelReadResult::Malformed(
+                    name, line, "un champ d'article connu",
+                    FormatString("Bordereau « %s », ligne %d : article %zu, champ inconnu « %s ».", name.c_str(), line,
+                                 read.size() + 1, attributeName));
+            }
+            if (seen & (std::uint64_t{1} << position)) {
+                const int line = lineOf();
+                return VelReadResult::Malformed(
+                    name, line, "chaque champ une seule fois",
                     FormatString("Bordereau « %s », ligne %d : article %zu, champ « %s » en double.", name.c_str(),
-                                 lineOf(), read.size() + 1, attribute.name()));
+                                 line, read.size() + 1, attribute.name()));
+            }
             seen |= std::uint64_t{1} << position;
-            if (!SetFieldValue(*article, fields[position], attribute.value()))
-                return FileResult::Failure(
+            if (!SetFieldValue(*article, fields[position], attribute.value())) {
+                const int line = lineOf();
+                const char* kind = fields[position].type == CZodEVIArticleField::Type::Int ? "nombre entier" : "nombre";
+                return VelReadResult::Malformed(
+                    name, line, std::string("un ") + kind,
                     FormatString("Bordereau « %s », ligne %d : article %zu, champ « %s » : %s attendu, « %s » trouvé.",
-                                 name.c_str(), lineOf(), read.size() + 1, attribute.name(),
-                                 fields[position].type == CZodEVIArticleField::Type::Int ? "nombre entier" : "nombre",
-                                 attribute.value()));
+                                 name.c_str(), line, read.size() + 1, attribute.name(), kind, attribute.value()));
+            }
             expected = position + 1;
         }
-        if (node.first_child())
-            return FileResult::Failure(
+        if (node.first_child()) {
+            const int line = LineOfOffset(text, node.first_child().offset_debug());
+            return VelReadResult::Malformed(
+                name, line, FormatString("un élément <%s> vide", kScheduleArticle),
                 FormatString("Bordereau « %s », ligne %d : article %zu, contenu inattendu dans <%s>.", name.c_str(),
-                             LineOfOffset(text, node.first_child().offset_debug()), read.size() + 1, kScheduleArticle));
+                             line, read.size() + 1, kScheduleArticle));
+        }
         read.push_back(std::move(article));
     }
     out.reserve(out.size() + read.size());
@@ -763,8 +786,8 @@ FileResult ParseArticles(char* buffer, std::size_t size, std::string_view text, 
 
 // The articles of the text in `buffer`: read directly when it is as the writer makes it,
 // otherwise parsed in place by pugixml (see ParseArticles).
-FileResult ReadArticles(char* buffer, std::size_t size, std::string_view text, const std::string& name,
-                        ArticleVector& out)
+VelReadResult ReadArticles(char* buffer, std::size_t size, std::string_view text, const std::string& name,
+                           ArticleVector& out)
 {
     if (DirectReader(std::string_view(buffer, size)).Read(out))
         return {};
@@ -773,20 +796,25 @@ FileResult ReadArticles(char* buffer, std::size_t size, std::string_view text, c
 
 // The whole file in one piece, through the host, which keeps the identity of the bytes
 // read for the caller of this module.
-FileResult ReadWholeFile(const std::string& path, VelFileContent& content)
+VelReadResult ReadWholeFile(const std::string& path, VelFileContent& content)
 {
     std::error_code error;
     if (!std::filesystem::exists(path, error))
-        return FileResult::Failure(FormatString("Bordereau « %s » : fichier introuvable.", path.c_str()));
+        return VelReadResult::Failed(VelReadStatus::kNotFound, path, ENOENT,
+                                     FormatString("Bordereau « %s » : fichier introuvable.", path.c_str()));
     if (std::filesystem::is_directory(path, error))
-        return FileResult::Failure(FormatString("Bordereau « %s » : c'est un dossier, pas un fichier.", path.c_str()));
+        return VelReadResult::Failed(
+            VelReadStatus::kNotAFile, path, 0,
+            FormatString("Bordereau « %s » : c'est un dossier, pas un fichier.", path.c_str()));
     content = velReadFile(path);
     if (!content.opened)
-        return FileResult::Failure(FormatString("Bordereau « %s » : ouverture impossible (%s).", path.c_str(),
-                                                ErrnoText(content.error).c_str()));
+        return VelReadResult::Failed(VelReadStatus::kCannotOpen, path, content.error,
+                                     FormatString("Bordereau « %s » : ouverture impossible (%s).", path.c_str(),
+                                                  ErrnoText(content.error).c_str()));
     // Only a regular file has a size to read.
     if (!content.identity.readable)
-        return FileResult::Failure(FormatString("Bordereau « %s » : lecture impossible.", path.c_str()));
+        return VelReadResult::Failed(VelReadStatus::kCannotRead, path, 0,
+                                     FormatString("Bordereau « %s » : lecture impossible.", path.c_str()));
     return {};
 }
 
@@ -797,30 +825,30 @@ bool ReadScheduleDirectly(std::string_view text, ArticleVector& out)
     return DirectReader(text).Read(out);
 }
 
-FileResult ReadScheduleDocument(std::string_view text, const std::string& name, ArticleVector& out)
+VelReadResult ReadScheduleDocument(std::string_view text, const std::string& name, ArticleVector& out)
 {
     auto copy = std::make_unique_for_overwrite<char[]>(text.size() + 1);
     std::memcpy(copy.get(), text.data(), text.size());
     return ParseArticles(copy.get(), text.size(), text, name, out);
 }
 
-FileResult ReadScheduleText(std::string_view text, const std::string& name, ArticleVector& out)
+VelReadResult ReadScheduleText(std::string_view text, const std::string& name, ArticleVector& out)
 {
     auto copy = std::make_unique_for_overwrite<char[]>(text.size() + 1);
     std::memcpy(copy.get(), text.data(), text.size());
     return ReadArticles(copy.get(), text.size(), text, name, out);
 }
 
-FileResult ReadScheduleFile(const std::string& path, ArticleVector& out)
+VelReadResult ReadScheduleFile(const std::string& path, ArticleVector& out)
 {
     VelFileContent content;
-    if (FileResult read = ReadWholeFile(path, content); !read)
+    if (VelReadResult read = ReadWholeFile(path, content); !read)
         return read;
     if (ReadArticles(content.data.get(), content.size, std::string_view(content.data.get(), content.size), path, out))
         return {};
     // Parsing in place rewrote the text its lines were to be counted in: the message
     // comes from a second reading of the file, which errors alone pay for.
-    if (FileResult read = ReadWholeFile(path, content); !read)
+    if (VelReadResult read = ReadWholeFile(path, content); !read)
         return read;
     return ReadScheduleText(std::string_view(content.data.get(), content.size), path, out);
 }
@@ -830,26 +858,30 @@ std::string ScheduleToXml(const std::vector<const CZodEVIArticle*>& articles)
     return std::string(WriteSchedule(articles).Text());
 }
 
-FileResult WriteFileAtomically(const std::string& path, std::string_view content, bool keepBackup)
+VelReadResult WriteFileAtomically(const std::string& path, std::string_view content, bool keepBackup)
 {
     VelWriteOptions options;
     options.keepBackup = keepBackup;
     VelFileResult written = velWriteFileAtomically(path, content, options);
-    if (written && !written.message.empty())
+    if (!written)
+        return VelReadResult::Failed(VelReadStatus::kCannotWrite, path, written.error, std::move(written.message));
+    if (!written.message.empty())
         acutPrintf("%s\n", written.message.c_str());
-    return {written.ok, std::move(written.message)};
+    return {};
 }
 
-FileResult WriteScheduleFile(const std::string& path, const std::vector<const CZodEVIArticle*>& articles)
+VelReadResult WriteScheduleFile(const std::string& path, const std::vector<const CZodEVIArticle*>& articles)
 {
     if (path.empty())
-        return FileResult::Failure("Bordereau sans nom de fichier : rien n'est écrit.");
+        return VelReadResult::Failed(VelReadStatus::kCannotWrite, path, 0,
+                                     "Bordereau sans nom de fichier : rien n'est écrit.");
     // Another program holding the schedule's lock is checking or writing it.
     const VelFileLock lock(path);
     if (!lock.locked())
-        return FileResult::Failure("Bordereau : " + lock.result().message);
+        return VelReadResult::Failed(VelReadStatus::kCannotWrite, path, lock.result().error,
+                                     "Bordereau : " + lock.result().message);
     const ScheduleWriter text = WriteSchedule(articles);
-    FileResult result = WriteFileAtomically(path, text.Text(), true);
+    VelReadResult result = WriteFileAtomically(path, text.Text(), true);
     if (!result)
         result.message = "Bordereau : " + result.message;
     return result;

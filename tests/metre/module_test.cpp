@@ -19,6 +19,8 @@
 
 #include <sstream>
 
+using namespace zodevi;
+
 namespace {
 
 class MetreModule : public ::testing::Test {
@@ -29,7 +31,7 @@ protected:
         velHostSettings().profileDir = dir.path.string();
         ASSERT_TRUE(acrxLoadModule(VEL_MODULE_DIR "/VelMetre15.arx", false));
         ASSERT_TRUE(acrxServiceIsRegistered(kVelMetreServicesName));
-        SetBdrMetre(&::MetreModule());
+        SetBdrMetre(&zodevi::MetreModule());
         bdr.path = dir.File("VelaBordereau.xml");
     }
     void TearDown() override

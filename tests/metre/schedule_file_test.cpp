@@ -11,6 +11,7 @@
 #include <algorithm>
 #include <bit>
 #include <cfloat>
+#include <cerrno>
 #include <climits>
 #include <cmath>
 #include <csignal>
@@ -89,7 +90,7 @@ TEST(ScheduleFile, EveryFieldRoundTrips)
     const std::string path = dir.File("VelaBordereau.xml");
     ASSERT_TRUE(metre::WriteScheduleFile(path, Pointers(articles)));
     ArticleVector read;
-    const metre::FileResult result = metre::ReadScheduleFile(path, read);
+    const VelReadResult result = metre::ReadScheduleFile(path, read);
     ASSERT_TRUE(result) << result.message;
     ASSERT_EQ(read.size(), articles.size());
     for (std::size_t i = 0; i < articles.size(); ++i) {
@@ -246,7 +247,7 @@ TEST(ScheduleFile, NumbersReadAsSetFieldTextReadsThem)
             CZodEVIArticle expected;
             const bool accepted = metre::SetFieldText(expected, *field, value);
             ArticleVector read;
-            const metre::FileResult result = metre::ReadScheduleText(
+            const VelReadResult result = metre::ReadScheduleText(
                 FormatString("<bordereau><article %s=\"%s\"/></bordereau>", field->name, value), "b.xml", read);
             ASSERT_EQ(static_cast<bool>(result), accepted) << result.message;
             if (accepted)
@@ -306,8 +307,15 @@ TEST(ScheduleFile, MalformedFilesAreRefusedWithTheirLine)
             c.content ? dir.Write(std::string(c.name) + ".xml", c.content) : dir.File("absent.xml");
         ArticleVector out;
         out.push_back(std::make_unique<CZodEVIArticle>());
-        const metre::FileResult result = metre::ReadScheduleFile(path, out);
-        EXPECT_FALSE(result);
+        const VelReadResult result = metre::ReadScheduleFile(path, out);
+        EXPECT_EQ(result.status, c.content ? VelReadStatus::kMalformed : VelReadStatus::kNotFound);
+        EXPECT_EQ(result.file, path);
+        if (c.content) {
+            // The line the message names is the one the caller is given.
+            EXPECT_NE(result.message.find(", ligne " + std::to_string(result.line) + " : "), std::string::npos)
+                << result.message;
+            EXPECT_FALSE(result.expected.empty());
+        }
         EXPECT_NE(result.message.find(path), std::string::npos) << result.message;
         EXPECT_NE(result.message.find(c.expected), std::string::npos) << result.message;
         EXPECT_EQ(out.size(), 1u) << "a refused file delivers nothing";
@@ -389,20 +397,22 @@ TEST(ScheduleFile, DirectReadingAgreesWithTheDocumentOrStandsAside)
         ArticleVector direct, document, read, fromFile;
         direct.push_back(std::make_unique<CZodEVIArticle>());
         EXPECT_EQ(metre::ReadScheduleDirectly(c.text, direct), c.direct);
-        const metre::FileResult byDocument = metre::ReadScheduleDocument(c.text, "b.xml", document);
+        const VelReadResult byDocument = metre::ReadScheduleDocument(c.text, "b.xml", document);
         EXPECT_EQ(static_cast<bool>(byDocument), c.reads) << byDocument.message;
         if (!c.direct) {
             EXPECT_EQ(direct.size(), 1u) << "a text left to the document reading is not read in part";
         }
         direct.erase(direct.begin());
-        const metre::FileResult result = metre::ReadScheduleText(c.text, "b.xml", read);
-        EXPECT_EQ(result.ok, byDocument.ok);
+        const VelReadResult result = metre::ReadScheduleText(c.text, "b.xml", read);
+        EXPECT_EQ(result.status, byDocument.status);
+        EXPECT_EQ(result.line, byDocument.line);
         EXPECT_EQ(result.message, byDocument.message);
         // The file goes through the reading in place, which messages count lines apart from.
         const std::string path = dir.Write("b.xml", c.text);
-        const metre::FileResult fileResult = metre::ReadScheduleFile(path, fromFile);
-        EXPECT_EQ(fileResult.ok, byDocument.ok);
-        EXPECT_EQ(fileResult.ok ? fileResult.message : Replaced(fileResult.message, path, "b.xml"), byDocument.message);
+        const VelReadResult fileResult = metre::ReadScheduleFile(path, fromFile);
+        EXPECT_EQ(fileResult.status, byDocument.status);
+        EXPECT_EQ(fileResult.line, byDocument.line);
+        EXPECT_EQ(fileResult ? fileResult.message : Replaced(fileResult.message, path, "b.xml"), byDocument.message);
         for (const ArticleVector* other : {&direct, &read, &fromFile}) {
             if (other == &direct && !c.direct)
                 continue;
@@ -449,11 +459,12 @@ TEST(ScheduleFile, WriteThatFailsMidwayLeavesFileAndBackup)
     struct rlimit small = saved;
     small.rlim_cur = 64 * 1024;
     ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &small), 0);
-    const metre::FileResult result = metre::WriteScheduleFile(path, Pointers(many));
+    const VelReadResult result = metre::WriteScheduleFile(path, Pointers(many));
     setrlimit(RLIMIT_FSIZE, &saved);
     std::signal(SIGXFSZ, previousHandler);
 
-    EXPECT_FALSE(result);
+    EXPECT_EQ(result.status, VelReadStatus::kCannotWrite);
+    EXPECT_EQ(result.error, EFBIG);
     EXPECT_NE(result.message.find("non enregistré : fichier trop gros pour ce disque (pendant l'écriture)"),
               std::string::npos)
         << result.message;
@@ -470,8 +481,8 @@ TEST(ScheduleFile, WriteIntoMissingFolderFailsCleanly)
 {
     TempDir dir;
     CZodEVIArticle a;
-    const metre::FileResult result = metre::WriteScheduleFile(dir.File("absent/b.xml"), {&a});
-    EXPECT_FALSE(result);
+    const VelReadResult result = metre::WriteScheduleFile(dir.File("absent/b.xml"), {&a});
+    EXPECT_EQ(result.status, VelReadStatus::kCannotWrite);
     EXPECT_NE(result.message.find("absent/b.xml"), std::string::npos);
     EXPECT_FALSE(std::filesystem::exists(dir.path / "absent"));
 }

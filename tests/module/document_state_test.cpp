@@ -7,6 +7,8 @@
 #include "support/session.hpp"
 #include "velhost/editor.h"
 
+using namespace zodevi;
+
 namespace {
 
 int Var(const char* name)

@@ -14,6 +14,8 @@
 #include "velsiblings/main_services.h"
 #include "zodevi/api.h"
 
+using namespace zodevi;
+
 namespace {
 
 void Nothing() {}

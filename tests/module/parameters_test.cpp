@@ -8,6 +8,8 @@
 #include "support/temp_dir.hpp"
 #include "velhost/profile.h"
 
+using namespace zodevi;
+
 namespace {
 
 class Parameters : public ::testing::Test {

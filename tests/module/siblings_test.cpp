@@ -10,6 +10,8 @@
 #include "support/temp_dir.hpp"
 #include "velhost/profile.h"
 
+using namespace zodevi;
+
 namespace fs = std::filesystem;
 
 namespace {

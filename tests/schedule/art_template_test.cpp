@@ -3,6 +3,8 @@
 
 #include <gtest/gtest.h>
 
+using namespace zodevi;
+
 namespace {
 
 TEST(CZodEVIArtTemplate, PerNetworkTextsCarryTheirSentence)

@@ -4,6 +4,8 @@
 
 #include <gtest/gtest.h>
 
+using namespace zodevi;
+
 namespace {
 
 // The readers and writers walk the record through its field table: it must name each of

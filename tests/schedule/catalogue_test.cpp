@@ -9,6 +9,8 @@
 #include <set>
 #include <sstream>
 
+using namespace zodevi;
+
 namespace {
 
 std::string Unescape(const std::string& field)

@@ -19,6 +19,8 @@
 #include <functional>
 #include <sstream>
 
+using namespace zodevi;
+
 namespace {
 
 // A metre module whose file and answers each test sets.

@@ -11,6 +11,8 @@
 #include <map>
 #include <random>
 
+using namespace zodevi;
+
 namespace {
 
 // Adds an article filed in its group, as the updates do.

@@ -7,7 +7,7 @@
 #include "schedule/schedule_store.hpp"
 
 // Stores a copy of `fields` and files it in its group (none for an empty key).
-inline CZodEVIArticle* AddFiled(CZodEVIBdr& bdr, CZodEVIArticle fields)
+inline CZodEVIArticle* AddFiled(zodevi::CZodEVIBdr& bdr, CZodEVIArticle fields)
 {
     CZodEVIArticle* added = bdr.AddArticle(std::make_unique<CZodEVIArticle>(std::move(fields)));
     if (!added->groupKey.empty())

@@ -10,6 +10,8 @@
 #include <string>
 #include <vector>
 
+using namespace zodevi;
+
 namespace {
 
 // A small schedule: road articles (one lump sum), an EU network group with its lump sum,

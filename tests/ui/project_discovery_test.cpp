@@ -12,6 +12,8 @@
 #include "support/drawing.hpp"
 #include "velhost/dbase.h"
 
+using namespace zodevi;
+
 namespace {
 
 using Items = std::vector<std::function<resbuf*()>>;

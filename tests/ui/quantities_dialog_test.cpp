@@ -11,6 +11,8 @@
 #include "velhost/commands.h"
 #include "velhost/documents.h"
 
+using namespace zodevi;
+
 namespace {
 
 // The network sizing module standing in: the EU network's projects.

@@ -11,6 +11,8 @@
 #include "velhost/profile.h"
 #include "velhost/ui.h"
 
+namespace zodevi {
+
 namespace {
 
 // The registry value buffer: a longer value fails to read, as a too small buffer would.
@@ -154,3 +156,5 @@ bool AskYesNo(const char* question, bool hasDefault, bool defaultIsYes, bool& an
     answer = EqualsNoCase(reply, "Yes");
     return true;
 }
+
+} // namespace zodevi

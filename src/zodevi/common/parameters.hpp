@@ -4,6 +4,8 @@
 
 #include <string>
 
+namespace zodevi {
+
 // The INI read limit: a longer value is cut to 4095 bytes.
 inline constexpr std::size_t kIniReadBufferSize = 4096;
 
@@ -36,3 +38,5 @@ bool AskYesNo(const char* question, bool hasDefault, bool defaultIsYes, bool& an
 // The name of the last parameter file written or reported, for tests and diagnostics.
 const std::string& LastParameterFile();
 void ResetLastParameterFile();
+
+} // namespace zodevi

@@ -8,6 +8,8 @@
 #include <utility>
 #include <vector>
 
+namespace zodevi {
+
 namespace {
 
 bool ApplyThicknesses(CZodEVIBdr& bdr, std::initializer_list<int> kinds, const CZodEVIValueArray<double>& thicknesses)
@@ -64,3 +66,5 @@ bool UpdatePlaning(CZodEVIBdr& bdr, const CZodEVIValueArray<double>& classLimits
     }
     return changed;
 }
+
+} // namespace zodevi

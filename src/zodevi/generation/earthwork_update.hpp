@@ -5,6 +5,8 @@
 #include "schedule/schedule_store.hpp"
 #include "zodevi/value_array.h"
 
+namespace zodevi {
+
 // One volume and one surface article per stripping thickness (metres); true when an
 // article was created or removed.
 bool UpdateStripping(CZodEVIBdr& bdr, const CZodEVIValueArray<double>& thicknesses);
@@ -16,3 +18,5 @@ bool UpdateVegetation(CZodEVIBdr& bdr, const CZodEVIValueArray<double>& thicknes
 // at 0, and one for thicknesses above the last limit; true when an article was created
 // or removed.
 bool UpdatePlaning(CZodEVIBdr& bdr, const CZodEVIValueArray<double>& classLimits);
+
+} // namespace zodevi

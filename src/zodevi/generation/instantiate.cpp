@@ -7,6 +7,8 @@
 #include <optional>
 #include <unordered_set>
 
+namespace zodevi {
+
 namespace {
 
 // One piece of a code pattern: literal text, or a placeholder as the matcher reads it.
@@ -409,3 +411,5 @@ bool InstantiateFixed(CZodEVIBdr& bdr, int networkIndex, const std::string& netw
                 std::nullopt, groupKey, group);
     return true;
 }
+
+} // namespace zodevi

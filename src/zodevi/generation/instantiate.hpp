@@ -11,6 +11,8 @@
 #include <utility>
 #include <vector>
 
+namespace zodevi {
+
 // True when the quantity key is the code pattern between double quotes with each
 // placeholder replaced the way the pattern writes it: any text for "%s", a number with
 // exactly the pattern's decimals for "%.2f" or "%.3f". Literal parts compare exactly.
@@ -61,3 +63,5 @@ std::vector<std::pair<double, double>> ConsecutivePairs(const CZodEVIValueArray<
 
 // The templates of one kind, in catalogue order.
 std::vector<const CZodEVIArtTemplate*> TemplatesOfKind(const CZodEVIBdr& bdr, int kind);
+
+} // namespace zodevi

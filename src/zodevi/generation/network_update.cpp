@@ -6,6 +6,8 @@
 
 #include <initializer_list>
 
+namespace zodevi {
+
 namespace {
 
 // Fixed articles of a new network group, in the order they are numbered (kind 10 has
@@ -120,3 +122,5 @@ bool UpdateDepthClasses(CZodEVIBdr& bdr, const CZodEVIValueArray<double>& depthB
     }
     return changed;
 }
+
+} // namespace zodevi

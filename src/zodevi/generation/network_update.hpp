@@ -9,6 +9,8 @@
 #include <string>
 #include <vector>
 
+namespace zodevi {
+
 // Brings the group PRJ_RES(<networkName>) up to date: the fixed articles when the group
 // is new, then one article per name and depth class that has none yet, the obsolete
 // ones removed while the purge flag is on. Lists: pipe and cable models, supplies along
@@ -24,3 +26,5 @@ bool UpdateNetwork(CZodEVIBdr& bdr, int networkIndex, const std::string& network
 // group order; nothing happens for an empty list. True when an article was created or
 // removed.
 bool UpdateDepthClasses(CZodEVIBdr& bdr, const CZodEVIValueArray<double>& depthBounds);
+
+} // namespace zodevi

@@ -4,6 +4,8 @@
 
 #include "generation/instantiate.hpp"
 
+namespace zodevi {
+
 namespace {
 
 bool ApplyNames(CZodEVIBdr& bdr, int kind, const std::vector<std::string>& names, const std::string& groupKey,
@@ -51,3 +53,5 @@ bool UpdateMaterials(CZodEVIBdr& bdr, const std::vector<std::string>& volumeMate
         changed |= ApplyNames(bdr, family.kind, family.names, groupKey, group);
     return changed;
 }
+
+} // namespace zodevi

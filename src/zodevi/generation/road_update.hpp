@@ -7,6 +7,8 @@
 #include <string>
 #include <vector>
 
+namespace zodevi {
+
 // One length and one coil-count article per comb-duct model; true when an article was
 // created or removed.
 bool UpdateCombDucts(CZodEVIBdr& bdr, const std::vector<std::string>& models);
@@ -16,3 +18,5 @@ bool UpdateCombDucts(CZodEVIBdr& bdr, const std::vector<std::string>& models);
 // the length list; true when an article was created or removed.
 bool UpdateMaterials(CZodEVIBdr& bdr, const std::vector<std::string>& volumeMaterials,
                      const std::vector<std::string>& surfaceMaterials, const std::vector<std::string>& lengthMaterials);
+
+} // namespace zodevi

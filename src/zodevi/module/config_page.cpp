@@ -12,6 +12,8 @@
 #include "velhost/ui.h"
 #include "zodevi/api.h"
 
+namespace zodevi {
+
 DlgChildCfgUser::DlgChildCfgUser()
 {
     if (CurrentBdr() != nullptr)
@@ -81,10 +83,12 @@ void DlgChildCfgUser::OnApply()
                    m_strPath.c_str());
 }
 
+} // namespace zodevi
+
 ZODEVI_EXPORT void Vel_ZodEVI_CfgUser(CVelConfigPage** page, void* /*parent*/)
 {
     if (page == nullptr)
         return;
-    ResourceOverride resources;
-    *page = new DlgChildCfgUser();
+    zodevi::ResourceOverride resources;
+    *page = new zodevi::DlgChildCfgUser();
 }

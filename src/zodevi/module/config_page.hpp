@@ -7,6 +7,8 @@
 
 #include "velsiblings/config_services.h"
 
+namespace zodevi {
+
 class DlgChildCfgUser : public CVelConfigPage {
 public:
     DlgChildCfgUser();
@@ -23,3 +25,5 @@ public:
 };
 
 inline constexpr const char* kCfgUnreadableSchedule = "ERREUR : impossible de lire le bordereau des prix !";
+
+} // namespace zodevi

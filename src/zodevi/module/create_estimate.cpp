@@ -10,6 +10,8 @@
 #include "ui/quantities_dialog.hpp"
 #include "velhost/ui.h"
 
+namespace zodevi {
+
 std::string ChooseEstimateName(const std::vector<std::string>& existing)
 {
     std::string name = "Devis";
@@ -59,3 +61,5 @@ void CreateEstimateCommand()
     // The lines stay ours whatever the metre module answers; they go with `lines`.
     sibling::VtMetre_AfficherAssoc(ChooseEstimateName(existing), &handed, 1, 0);
 }
+
+} // namespace zodevi

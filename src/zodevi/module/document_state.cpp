@@ -6,6 +6,8 @@
 #include "velhost/editor.h"
 #include "velhost/header_vars.h"
 
+namespace zodevi {
+
 namespace {
 
 AcDbDatabase* WorkingDatabase()
@@ -123,3 +125,5 @@ void CArxGlobals::ForgetDrawing()
 {
     source = nullptr;
 }
+
+} // namespace zodevi

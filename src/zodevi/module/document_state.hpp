@@ -10,6 +10,8 @@
 #include "velhost/dbase.h"
 #include "velhost/documents.h"
 
+namespace zodevi {
+
 class CArxGlobals {
 public:
     explicit CArxGlobals(bool saveAtCreation = false, bool restoreLayer = true, bool echo = false);
@@ -147,3 +149,5 @@ private:
     std::vector<AcApDocument*> pendingDocuments;
     std::vector<std::unique_ptr<T>> pendingRecords;
 };
+
+} // namespace zodevi

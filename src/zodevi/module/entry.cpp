@@ -5,6 +5,8 @@
 #include "module/siblings.hpp"
 #include "schedule/schedule_store.hpp"
 
+namespace zodevi {
+
 namespace {
 
 // The schedule's constructor finds its default file through the main services; the
@@ -59,10 +61,12 @@ Library g_library;
 
 } // namespace
 
+} // namespace zodevi
+
 extern "C" __attribute__((visibility("default"))) AcRx::AppRetCode acrxEntryPoint(AcRx::AppMsgCode message,
                                                                                   void* packet)
 {
-    CVelSrvModul* module = ModuleObject();
+    zodevi::CVelSrvModul* module = zodevi::ModuleObject();
     if (module == nullptr)
         return AcRx::kRetError;
     return module->OnAppMessage(message, packet);

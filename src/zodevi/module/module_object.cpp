@@ -17,6 +17,8 @@
 #include "velsiblings/config_services.h"
 #include "zodevi/api.h"
 
+namespace zodevi {
+
 namespace {
 
 CVelSrvModul* g_module = nullptr;
@@ -246,7 +248,7 @@ std::string MainServicesEnvironment::ReadParameter(const std::string& file, cons
                                                    const std::string& key, const std::string& defaultValue)
 {
     std::string value;
-    ::ReadParameter(file.c_str(), section.c_str(), key.c_str(), defaultValue.c_str(), value);
+    zodevi::ReadParameter(file.c_str(), section.c_str(), key.c_str(), defaultValue.c_str(), value);
     return value;
 }
 
@@ -278,3 +280,5 @@ void ListCommandsCommand()
 }
 
 void TestCommand() {}
+
+} // namespace zodevi

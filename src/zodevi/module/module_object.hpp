@@ -11,6 +11,8 @@
 #include "schedule/schedule_store.hpp"
 #include "velhost/rx.h"
 
+namespace zodevi {
+
 inline constexpr const char* kZodEVIModuleName = "VelVuzazORE15";
 inline constexpr const char* kZodEVICommandGroup = "VELANTO_FONCTIONS_3D_VUZAZORE";
 inline constexpr const char* kZodEVITitle = "Métré pour modules VRD";
@@ -121,3 +123,5 @@ void CreateEstimateCommand();
 // regard to case with the existing names, each rename starting again from the first.
 std::string ChooseEstimateName(const std::vector<std::string>& existing);
 void TestCommand();
+
+} // namespace zodevi

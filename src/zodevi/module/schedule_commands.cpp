@@ -7,6 +7,8 @@
 #include "schedule/schedule_exchange.hpp"
 #include "velhost/editor.h"
 
+namespace zodevi {
+
 void DisplayScheduleCommand()
 {
     MainServices()->ShowInfo("affiche le bordereau des prix");
@@ -26,3 +28,5 @@ void PurgeScheduleCommand()
     if (AskYesNo("Purger à la prochaine mise à jour", true, GetPurgeFlag(), purge))
         SetPurgeFlag(purge);
 }
+
+} // namespace zodevi

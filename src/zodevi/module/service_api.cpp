@@ -11,6 +11,8 @@
 #include "schedule/schedule_exchange.hpp"
 #include "zodevi/api.h"
 
+namespace zodevi {
+
 namespace {
 
 CZodEVIBdr* g_current = nullptr;
@@ -65,6 +67,11 @@ void SetCurrentBdr(CZodEVIBdr* bdr)
 {
     g_current = bdr;
 }
+
+} // namespace zodevi
+
+// The exported functions keep their C names outside the namespace.
+using namespace zodevi;
 
 ZODEVI_EXPORT std::int32_t ZodEVI_ReadBdr()
 {

@@ -8,7 +8,8 @@
 #include "velhost/rx.h"
 
 // What the module files under "VelantoZodEVIServices r17.2"; it only makes the
-// service name known, the exported functions hold no state of their own.
+// service name known, the exported functions hold no state of their own. A global name:
+// its type information is exported under it.
 class __attribute__((visibility("default"))) CVelZodEVISrv : public AcRxService {
 public:
     const char* className() const override { return "CVelZodEVISrv"; }
@@ -22,7 +23,11 @@ private:
     std::string version_ = "10.0";
 };
 
+namespace zodevi {
+
 // The schedule the exported functions apply to: the module's one schedule, or null
 // before it is built and after it is gone (the functions then answer failure).
 CZodEVIBdr* CurrentBdr();
 void SetCurrentBdr(CZodEVIBdr* bdr);
+
+} // namespace zodevi

@@ -5,6 +5,8 @@
 #include "text/text.hpp"
 #include "velsiblings/module_search.h"
 
+namespace zodevi {
+
 namespace {
 
 // "x.arx" and "A.ARX" already carry the extension; ".arx" alone does not.
@@ -116,3 +118,5 @@ CZodEVIBdrMetre& MetreModule()
     static MetreServices metre;
     return metre;
 }
+
+} // namespace zodevi

@@ -16,6 +16,8 @@
 #include "velsiblings/network_services.h"
 #include "zodevi/assoc_line.h"
 
+namespace zodevi {
+
 // Address of the function the service exports under symbolName, loading the module file
 // first when the service is not registered; null when anything is missing. Silent.
 void* GetServiceSymbol(const char* moduleFile, const char* serviceName, const char* symbolName);
@@ -66,3 +68,5 @@ std::int32_t VtMetre_AfficherAssoc(const std::string& name, std::vector<CZodEVIA
 // The metre module as the schedule takes it: its exported functions, reached through its
 // service (loading the module on demand), 1 when missing.
 CZodEVIBdrMetre& MetreModule();
+
+} // namespace zodevi

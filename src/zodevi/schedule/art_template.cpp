@@ -3,6 +3,8 @@
 
 #include "schedule/article.hpp"
 
+namespace zodevi {
+
 namespace {
 constexpr int kNetworkIndexCount = 13;
 }
@@ -146,3 +148,5 @@ int CZodEVIArtTemplateArray::SelectKind(int kind, CZodEVIArtTemplateArray& out) 
             out.items_.push_back(tmpl);
     return out.GetSize();
 }
+
+} // namespace zodevi

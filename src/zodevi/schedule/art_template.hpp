@@ -8,6 +8,8 @@
 #include <string>
 #include <vector>
 
+namespace zodevi {
+
 // The texts of a template for one network index.
 class CZodEVIArtParam {
 public:
@@ -87,3 +89,5 @@ private:
     std::vector<CZodEVIArtTemplate*> items_;
     bool owning_ = true;
 };
+
+} // namespace zodevi

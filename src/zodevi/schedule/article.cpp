@@ -4,6 +4,8 @@
 #include "schedule/art_template.hpp"
 #include "text/text.hpp"
 
+namespace zodevi {
+
 namespace {
 
 constexpr std::string_view kNetworkPrefix = "PRJ_RES(";
@@ -138,3 +140,5 @@ std::optional<std::string> DeriveCategory(const CZodEVIArticle& article)
         return std::nullopt;
     return category;
 }
+
+} // namespace zodevi

@@ -10,6 +10,8 @@
 #include <string>
 #include <string_view>
 
+namespace zodevi {
+
 class CZodEVIArtParam;
 
 // Article natures.
@@ -71,3 +73,5 @@ std::optional<std::string> DeriveCategory(const CZodEVIArticle& article);
 // The category with its nature level: the tree path cut before the separator that
 // precedes the code-and-designation part; nullopt without a backslash.
 std::optional<std::string> CategoryWithNatureLevel(std::string_view treePath);
+
+} // namespace zodevi

@@ -10,6 +10,8 @@
 #include <unordered_map>
 #include <unordered_set>
 
+namespace zodevi {
+
 namespace {
 
 // Code numbers in use under one folded prefix. Between two rebuilds numbers are only
@@ -309,3 +311,5 @@ std::string CZodEVIGroup::CheckIndexes() const
     }
     return problems;
 }
+
+} // namespace zodevi

@@ -13,6 +13,8 @@
 #include <string_view>
 #include <vector>
 
+namespace zodevi {
+
 // Result of a search by quantity key or tree path: the position in the searched list
 // and the article, or -1 and null.
 struct CZodEVIFound {
@@ -80,3 +82,5 @@ private:
     std::vector<CZodEVIArticle*> articles_;
     mutable std::unique_ptr<Indexes> indexes_;
 };
+
+} // namespace zodevi

@@ -7,6 +7,8 @@
 #include <string>
 #include <string_view>
 
+namespace zodevi {
+
 namespace {
 
 // Category pattern families of the network-dependent templates.
@@ -259,3 +261,5 @@ void FillStandardCatalogue(CZodEVIArtTemplateArray& catalogue)
         catalogue.InsertCopyAt(catalogue.GetSize(), work);
     }
 }
+
+} // namespace zodevi

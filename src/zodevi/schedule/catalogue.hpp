@@ -4,6 +4,8 @@
 
 #include "schedule/art_template.hpp"
 
+namespace zodevi {
+
 // Number of network indexes that have texts (0 EP ... 11 heating, 12 other).
 inline constexpr int kNetworkIndexCount = 13;
 
@@ -13,3 +15,5 @@ void FillStandardCatalogue(CZodEVIArtTemplateArray& catalogue);
 // The numbering prefix of a network index ("EP", "EU", "AEP", ...); empty for 12 and
 // above, where the generators take the network name's first characters.
 const char* NetworkNumberingPrefix(int networkIndex);
+
+} // namespace zodevi

@@ -8,6 +8,8 @@
 #include <utility>
 #include <vector>
 
+namespace zodevi {
+
 template <typename V>
 class InsertionMap {
 public:
@@ -44,3 +46,5 @@ private:
     std::unordered_map<std::string, std::size_t> index_;
     std::vector<Entry> entries_;
 };
+
+} // namespace zodevi

@@ -1,6 +1,8 @@
 // The metre module the schedule exchanges with, and the stand-in for its absence.
 #include "schedule/metre_link.hpp"
 
+namespace zodevi {
+
 namespace {
 
 class MissingMetre final : public CZodEVIBdrMetre {
@@ -29,3 +31,5 @@ CZodEVIBdrMetre& BdrMetre()
     static MissingMetre missing;
     return g_metre != nullptr ? *g_metre : missing;
 }
+
+} // namespace zodevi

@@ -10,6 +10,8 @@
 
 #include "zodevi/article.h"
 
+namespace zodevi {
+
 class CZodEVIBdrMetre {
 public:
     virtual ~CZodEVIBdrMetre() = default;
@@ -30,3 +32,5 @@ public:
 void SetBdrMetre(CZodEVIBdrMetre* metre);
 // The metre module set, or one that answers 1 to everything.
 CZodEVIBdrMetre& BdrMetre();
+
+} // namespace zodevi

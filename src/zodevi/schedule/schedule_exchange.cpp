@@ -13,6 +13,8 @@
 #include <filesystem>
 #include <memory>
 
+namespace zodevi {
+
 namespace {
 
 constexpr const char* kNoArticleMessage = "ERREUR : aucun article ne se réfère à l'élément !";
@@ -483,3 +485,5 @@ bool ShowPrice(CZodEVIBdr& bdr, int selector, const std::string& item, const std
         Write(bdr);
     return shown;
 }
+
+} // namespace zodevi

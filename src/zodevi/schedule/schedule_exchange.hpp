@@ -12,6 +12,8 @@
 #include <string>
 #include <vector>
 
+namespace zodevi {
+
 // The code pattern of a quantity selector (0 to 12); empty outside.
 std::string QuantityPatternOfSelector(int selector);
 
@@ -46,3 +48,5 @@ bool SetPrice(CZodEVIBdr& bdr, int selector, const std::string& item, double pri
 // Opens the editor on the article counting the quantity, or says that none does. An
 // empty network name searches every group for selectors 2-5, 7 and 8.
 bool ShowPrice(CZodEVIBdr& bdr, int selector, const std::string& item, const std::string& networkName);
+
+} // namespace zodevi

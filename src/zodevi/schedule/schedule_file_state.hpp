@@ -9,6 +9,8 @@
 
 #include "velhost/files.h"
 
+namespace zodevi {
+
 class CZodEVIBdr;
 
 struct CZodEVIBdrFileState {
@@ -24,3 +26,5 @@ struct CZodEVIBdrFileState {
     // Changes made in memory since the version above, in order.
     std::vector<std::function<void(CZodEVIBdr&)>> pending;
 };
+
+} // namespace zodevi

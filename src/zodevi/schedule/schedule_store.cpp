@@ -11,6 +11,8 @@
 #include <filesystem>
 #include <unordered_set>
 
+namespace zodevi {
+
 namespace {
 
 CZodEVIBdrEnvironment* g_environment = nullptr;
@@ -373,3 +375,5 @@ const int* CZodEVIBdr::NetworkIndexOf(const std::string& groupKey) const
 {
     return networkIndexes.Find(groupKey);
 }
+
+} // namespace zodevi

@@ -15,6 +15,8 @@
 #include <utility>
 #include <vector>
 
+namespace zodevi {
+
 using CZodEVIArticleList = std::vector<CZodEVIArticle*>;
 
 // What the schedule needs from outside to find its default file: the main services
@@ -135,3 +137,5 @@ inline constexpr const char* kBdrParameterKey = "Bordereau";
 
 // The default schedule path, resolved through the environment.
 std::string ResolveDefaultBdrPath(CZodEVIBdrEnvironment* environment);
+
+} // namespace zodevi

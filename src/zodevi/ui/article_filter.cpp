@@ -7,6 +7,8 @@
 
 #include "text/text.hpp"
 
+namespace zodevi {
+
 namespace {
 
 bool IsDroppedLevel(std::string_view level)
@@ -386,3 +388,5 @@ std::string QuantityColumnText(double total, const std::string& unit)
 {
     return unit.empty() ? TwoDecimals(total) : TwoDecimals(total) + " " + unit;
 }
+
+} // namespace zodevi

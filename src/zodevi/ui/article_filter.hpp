@@ -14,6 +14,8 @@
 #include "ui/project_discovery.hpp"
 #include "zodevi/assoc_line.h"
 
+namespace zodevi {
+
 // Pseudo-projects: the lump sums of no project group, and the non-graphic road articles
 // that any checked road, Korvane project or platform brings.
 inline constexpr const char* kLumpSumProject = "**Forfait";
@@ -149,3 +151,5 @@ void CollectEntries(const CZodEVIFilterInputs& inputs, CZodEVIFilterEntryArray& 
 // "12.50 €/m³" (or "12.50 €" without a unit), and "7.50 m³" (or "7.50").
 std::string PriceColumnText(const CZodEVIArticle& article, const std::string& currency);
 std::string QuantityColumnText(double total, const std::string& unit);
+
+} // namespace zodevi

@@ -3,6 +3,8 @@
 
 #include <utility>
 
+namespace zodevi {
+
 CZodEVIProjectMap* CZodEVIProjectMaps::OfKind(int kind) const
 {
     switch (kind) {
@@ -26,3 +28,5 @@ void DiscoverProjectsIn(AcDbDatabase* database, const CZodEVIProjectMaps& maps)
             map->Get(name) = std::move(quantities);
     });
 }
+
+} // namespace zodevi

@@ -9,6 +9,8 @@
 
 class AcDbDatabase;
 
+namespace zodevi {
+
 // Projects of one group by name (compared exactly), in the order of first insertion.
 using CZodEVIProjectMap = InsertionMap<velproj::QuantityTable>;
 
@@ -28,3 +30,5 @@ struct CZodEVIProjectMaps {
 // table (the entry met last wins). Reads only; every failure is silent and only gives
 // fewer projects.
 void DiscoverProjectsIn(AcDbDatabase* database, const CZodEVIProjectMaps& maps);
+
+} // namespace zodevi

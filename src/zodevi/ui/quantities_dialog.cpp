@@ -10,6 +10,8 @@
 #include "velhost/editor.h"
 #include "velhost/ui.h"
 
+namespace zodevi {
+
 namespace {
 
 constexpr const char* kDialogName = "VELANTO - TRAMVRD - ArtFilter";
@@ -590,3 +592,5 @@ int DlgMetExpArt::CopySelectedLines(std::vector<std::unique_ptr<CZodEVIAssocLine
             out.push_back(std::make_unique<CZodEVIAssocLine>(*line));
     return static_cast<int>(out.size());
 }
+
+} // namespace zodevi

@@ -18,6 +18,8 @@
 #include "velhost/dialog.h"
 #include "zodevi/assoc_line.h"
 
+namespace zodevi {
+
 // The dialog's template and controls.
 inline constexpr int IDD_METEXPART = 405;
 inline constexpr int IDC_TREE_ARTICLES = 2755;
@@ -143,3 +145,5 @@ private:
     std::unordered_map<const CZodEVIArticle*, std::size_t> m_positions;
     std::unordered_set<const CZodEVIAssocLine*> m_selectedSet;
 };
+
+} // namespace zodevi

@@ -78,10 +78,12 @@ TEST(EzdxfRoundTrip, OnlyWhatTheHostChangedDiffers)
         {"r2018_bin.dxf", true, "None", "Ω"},
         {"r12_bin.dxf", false, "20583", ""},
     };
+    // A folder of its own: runs of the suite side by side never share a file.
+    const TempDir dir;
     for (const auto& c : cases) {
         SCOPED_TRACE(c.file);
         const std::string original = std::string(VEL_TEST_DATA) + "/dxf/" + c.file;
-        const std::string saved = ::testing::TempDir() + "vel_ezdxf_" + c.file;
+        const std::string saved = dir.File(c.file);
         std::unique_ptr<AcDbDatabase> db;
         std::string error;
         ASSERT_EQ(velOpenDrawing(original, db).description(), "");
@@ -103,14 +105,14 @@ TEST(EzdxfRoundTrip, OnlyWhatTheHostChangedDiffers)
         }
         EXPECT_EQ(Minus(before, after), gone);
         EXPECT_EQ(Minus(after, before), added);
-        std::remove(saved.c_str());
     }
 }
 
 TEST(EzdxfRoundTrip, UnknownEntitiesAndObjectsAreKeptByteForByte)
 {
     const std::string original = std::string(VEL_TEST_DATA) + "/dxf/r2018.dxf";
-    const std::string saved = ::testing::TempDir() + "vel_ezdxf_unknown.dxf";
+    const TempDir dir;
+    const std::string saved = dir.File("unknown.dxf");
     std::unique_ptr<AcDbDatabase> db;
     std::string error;
     ASSERT_EQ(velOpenDrawing(original, db).description(), "");
@@ -127,7 +129,6 @@ TEST(EzdxfRoundTrip, UnknownEntitiesAndObjectsAreKeptByteForByte)
         EXPECT_NE(after.find(raw), std::string::npos);
     }
     EXPECT_NE(after.find(" valeur  avec espaces \n"), std::string::npos);
-    std::remove(saved.c_str());
 }
 
 } // namespace

@@ -78,11 +78,12 @@ TEST(EzdxfRoundTrip, OnlyWhatTheHostChangedDiffers)
         {"r2018_bin.dxf", true, "None", "Ω"},
         {"r12_bin.dxf", false, "20583", ""},
     };
+    // A folder of its own: runs of the suite side by side never share a file.
     const TempDir dir;
     for (const auto& c : cases) {
         SCOPED_TRACE(c.file);
         const std::string original = std::string(VEL_TEST_DATA) + "/dxf/" + c.file;
-        const std::string saved = (dir.path / c.file).string();
+        const std::string saved = dir.File(c.file);
         std::unique_ptr<AcDbDatabase> db;
         std::string error;
         ASSERT_EQ(velOpenDrawing(original, db).description(), "");
@@ -111,7 +112,7 @@ TEST(EzdxfRoundTrip, UnknownEntitiesAndObjectsAreKeptByteForByte)
 {
     const std::string original = std::string(VEL_TEST_DATA) + "/dxf/r2018.dxf";
     const TempDir dir;
-    const std::string saved = (dir.path / "unknown.dxf").string();
+    const std::string saved = dir.File("unknown.dxf");
     std::unique_ptr<AcDbDatabase> db;
     std::string error;
     ASSERT_EQ(velOpenDrawing(original, db).description(), "");

@@ -57,43 +57,34 @@ TEST(UpdateNetwork, FirstUpdateMakesTheFixedArticlesInOrder)
         const char* unit;
         const char* treePath;
     };
+    // Under "EU 1\\", the GC articles under "Travaux de génie civil\\".
     const Expected expected[] = {
-        {"TP-001", "", "", R"(EU 1\\Travaux préparatoires\\Non Graphique\\TP-001 - Installation du chantier)"},
-        {"TP-002", "", "", R"(EU 1\\Travaux préparatoires\\Non Graphique\\TP-002 - Piquetage, implantation, sondage)"},
-        {"EU-001", "RSX_LIN_TOT_3D", "ml",
-         R"(EU 1\\Canalisation EU\\Linéaire\\EU-001 - Longueur 3D des canalisations)"},
-        {"EU-002", "RSX_BRA_LIN_3D", "ml", R"(EU 1\\Canalisation EU\\Linéaire\\EU-002 - Longueur 3D des branchements)"},
-        {"EU-003", "RSX_BRA_BX_NB", "", R"(EU 1\\Branchements\\Ponctuel\\EU-003 - Boîtes clients)"},
-        {"GC-001", "RSX_LIN_FDT_2D", "ml",
-         R"(EU 1\\Travaux de génie civil\\Traitement du sol de fondation\\Linéaire\\GC-001 - Longueur 2D)"},
-        {"GC-002", "RSX_LIN_FDT_3D", "ml",
-         R"(EU 1\\Travaux de génie civil\\Traitement du sol de fondation\\Linéaire\\GC-002 - Longueur 3D)"},
-        {"GC-003", "RSX_LIN_DEC_2D", "ml",
-         R"(EU 1\\Travaux de génie civil\\Démolition de chausée\\Linéaire\\GC-003 - Longueur 2D de découpage)"},
-        {"GC-004", "RSX_LIN_DEC_3D", "ml",
-         R"(EU 1\\Travaux de génie civil\\Démolition de chausée\\Linéaire\\GC-004 - Longueur 3D de découpage)"},
+        {"TP-001", "", "", R"(Travaux préparatoires\\Non Graphique\\TP-001 - Installation du chantier)"},
+        {"TP-002", "", "", R"(Travaux préparatoires\\Non Graphique\\TP-002 - Piquetage, implantation, sondage)"},
+        {"EU-001", "RSX_LIN_TOT_3D", "ml", R"(Canalisation EU\\Linéaire\\EU-001 - Longueur 3D des canalisations)"},
+        {"EU-002", "RSX_BRA_LIN_3D", "ml", R"(Canalisation EU\\Linéaire\\EU-002 - Longueur 3D des branchements)"},
+        {"EU-003", "RSX_BRA_BX_NB", "", R"(Branchements\\Ponctuel\\EU-003 - Boîtes clients)"},
+        {"GC-001", "RSX_LIN_FDT_2D", "ml", R"(Traitement du sol de fondation\\Linéaire\\GC-001 - Longueur 2D)"},
+        {"GC-002", "RSX_LIN_FDT_3D", "ml", R"(Traitement du sol de fondation\\Linéaire\\GC-002 - Longueur 3D)"},
+        {"GC-003", "RSX_LIN_DEC_2D", "ml", R"(Démolition de chausée\\Linéaire\\GC-003 - Longueur 2D de découpage)"},
+        {"GC-004", "RSX_LIN_DEC_3D", "ml", R"(Démolition de chausée\\Linéaire\\GC-004 - Longueur 3D de découpage)"},
         {"GC-005", "RSX_LIN_BLI_2D", "ml",
-         R"(EU 1\\Travaux de génie civil\\Terrassements\\Protection contre les éboulements\\Linéaire\\GC-005 - Longueur 2D blindée)"},
-        {"GC-006", "RSX_SFC_DEC", "m²",
-         R"(EU 1\\Travaux de génie civil\\Démolition de chausée\\Surfacique\\GC-006 - Surface 2D de démolition)"},
+         R"(Terrassements\\Protection contre les éboulements\\Linéaire\\GC-005 - Longueur 2D blindée)"},
+        {"GC-006", "RSX_SFC_DEC", "m²", R"(Démolition de chausée\\Surfacique\\GC-006 - Surface 2D de démolition)"},
         {"GC-007", "RSX_SFC_BLI", "m²",
-         R"(EU 1\\Travaux de génie civil\\Terrassements\\Protection contre les éboulements\\Surfacique\\GC-007 - Surface de blindage)"},
-        {"GC-008", "RSX_VOL_FOU", "m³",
-         R"(EU 1\\Travaux de génie civil\\Terrassements\\Tranchées\\Volumique\\GC-008 - Volume de fouille)"},
+         R"(Terrassements\\Protection contre les éboulements\\Surfacique\\GC-007 - Surface de blindage)"},
+        {"GC-008", "RSX_VOL_FOU", "m³", R"(Terrassements\\Tranchées\\Volumique\\GC-008 - Volume de fouille)"},
         {"GC-009", "RSX_BRA_VOL_FO", "m³",
-         R"(EU 1\\Travaux de génie civil\\Terrassements\\Tranchées des branchements\\Volumique\\GC-009 - Volume de fouille)"},
-        {"GC-010", "RSX_VOL_FDT", "m³",
-         R"(EU 1\\Travaux de génie civil\\Traitement du sol de fondation\\Volumique\\GC-010 - Volume)"},
+         R"(Terrassements\\Tranchées des branchements\\Volumique\\GC-009 - Volume de fouille)"},
+        {"GC-010", "RSX_VOL_FDT", "m³", R"(Traitement du sol de fondation\\Volumique\\GC-010 - Volume)"},
         {"GC-011", "RSX_VOL_LPO", "m³",
-         R"(EU 1\\Travaux de génie civil\\Terrassements\\Enrobage et lit de pose\\Volumique\\GC-011 - Volume de lit de pose)"},
+         R"(Terrassements\\Enrobage et lit de pose\\Volumique\\GC-011 - Volume de lit de pose)"},
         {"GC-012", "RSX_VOL_EBG", "m³",
-         R"(EU 1\\Travaux de génie civil\\Terrassements\\Enrobage et lit de pose\\Volumique\\GC-012 - Volume d'enrobage)"},
-        {"GC-013", "RSX_VOL_RBL", "m³",
-         R"(EU 1\\Travaux de génie civil\\Terrassements\\Remblais et apports\\Volumique\\GC-013 - Volume de remblai)"},
-        {"GC-014", "RSX_VOL_DEC", "m³",
-         R"(EU 1\\Travaux de génie civil\\Démolition de chausée\\Volumique\\GC-014 - Volume de démolition)"},
+         R"(Terrassements\\Enrobage et lit de pose\\Volumique\\GC-012 - Volume d'enrobage)"},
+        {"GC-013", "RSX_VOL_RBL", "m³", R"(Terrassements\\Remblais et apports\\Volumique\\GC-013 - Volume de remblai)"},
+        {"GC-014", "RSX_VOL_DEC", "m³", R"(Démolition de chausée\\Volumique\\GC-014 - Volume de démolition)"},
         {"GC-015", "RSX_VOL_BLI", "m³",
-         R"(EU 1\\Travaux de génie civil\\Terrassements\\Protection contre les éboulements\\Volumique\\GC-015 - Volume de blindage)"},
+         R"(Terrassements\\Protection contre les éboulements\\Volumique\\GC-015 - Volume de blindage)"},
     };
     CZodEVIBdr bdr;
     EXPECT_TRUE(Update(bdr, 1, "EU 1"));
@@ -108,7 +99,9 @@ TEST(UpdateNetwork, FirstUpdateMakesTheFixedArticlesInOrder)
         EXPECT_EQ(a.code, expected[i].code);
         EXPECT_EQ(a.quantityKey, MakeQuantityKey(expected[i].key));
         EXPECT_EQ(a.unit, expected[i].unit);
-        EXPECT_EQ(a.treePath, expected[i].treePath);
+        const bool civil = std::string_view(expected[i].code).starts_with("GC");
+        EXPECT_EQ(a.treePath,
+                  std::string("EU 1\\\\") + (civil ? "Travaux de génie civil\\\\" : "") + expected[i].treePath);
         EXPECT_EQ(a.groupKey, "PRJ_RES(EU 1)");
         EXPECT_EQ(a.unitPrice, 0);
         EXPECT_EQ(a.taxRate, 19.6);

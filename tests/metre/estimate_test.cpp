@@ -39,6 +39,21 @@ const std::string kPipePath = "Réseaux\\\\EU1\\\\Linéaire\\\\EU-001 - Tuyau PV
 const std::string kPavingPath = "Voirie\\\\Chaussée\\\\Surfacique\\\\TP-004 - Enrobé";
 const std::string kTestsPath = "Divers\\\\Non Graphique\\\\DV-001 - Essais";
 
+// A line of the quantities dialog, its projects given by name only.
+CZodEVIAssocLine Line(const std::string& label, int lineKind, const std::string& quantityKey,
+                      const std::string& projects, int projectKind, const std::string& treePath,
+                      const std::string& unit, double unitPrice)
+{
+    return {.label = label,
+            .lineKind = lineKind,
+            .quantityKey = quantityKey,
+            .projects = projects,
+            .projectKind = projectKind,
+            .treePath = treePath,
+            .unit = unit,
+            .unitPrice = unitPrice};
+}
+
 class EstimateTest : public ::testing::Test {
 protected:
     void SetUp() override
@@ -51,32 +66,10 @@ protected:
                    {Key("\"PRJ_SFC_MAT_Enrobé\""), velRbString(kXdAsciiString, "250.5 m2")});
         AddProject(*db, "VELANTO_PFM_VRD", "PROJECTS", "F1", "Plateforme",
                    {Key("\"prj_sfc_mat_enrobé\""), velRbLong(kXdInteger32, 100)});
-        lines = {
-            {.label = "Tuyau PVC 200",
-             .lineKind = 3,
-             .quantityKey = "\"RSX_TUY_LIN_3D_PVC 200\"",
-             .projects = "EU1",
-             .projectKind = 3,
-             .treePath = kPipePath,
-             .unit = "ml",
-             .unitPrice = 45.5},
-            {.label = "Enrobé",
-             .lineKind = 3,
-             .quantityKey = "\"PRJ_SFC_MAT_Enrobé\"",
-             .projects = "Route A,Plateforme",
-             .projectKind = 2,
-             .treePath = kPavingPath,
-             .unit = "m²",
-             .unitPrice = 12.345},
-            {.label = "Essais", .lineKind = 5, .projects = "**Forfait", .treePath = kTestsPath, .unitPrice = 1.005},
-            {.label = "Tuyau PVC 200 (EU2)",
-             .lineKind = 3,
-             .quantityKey = "\"RSX_TUY_LIN_3D_PVC 200\"",
-             .projects = "EU2",
-             .projectKind = 3,
-             .treePath = kPipePath,
-             .unit = "ml",
-             .unitPrice = 45.5}};
+        lines = {Line("Tuyau PVC 200", 3, "\"RSX_TUY_LIN_3D_PVC 200\"", "EU1", 3, kPipePath, "ml", 45.5),
+                 Line("Enrobé", 3, "\"PRJ_SFC_MAT_Enrobé\"", "Route A,Plateforme", 2, kPavingPath, "m²", 12.345),
+                 Line("Essais", 5, "", "**Forfait", 0, kTestsPath, "", 1.005),
+                 Line("Tuyau PVC 200 (EU2)", 3, "\"RSX_TUY_LIN_3D_PVC 200\"", "EU2", 3, kPipePath, "ml", 45.5)};
         for (const auto& [code, path, rate] :
              {std::tuple{"EU-001", kPipePath, 19.6}, std::tuple{"TP-004", kPavingPath, 19.6},
               std::tuple{"DV-001", kTestsPath, 5.5}}) {
@@ -216,14 +209,7 @@ TEST_F(EstimateTest, LineQuantitiesFollowTheirProjectsAndKinds)
 TEST_F(EstimateTest, ChecksBeforeSending)
 {
     const auto paving = [](const char* label, const std::string& treePath, const char* unit, double unitPrice) {
-        return CZodEVIAssocLine{.label = label,
-                                .lineKind = 3,
-                                .quantityKey = "\"PRJ_SFC_MAT_Enrobé\"",
-                                .projects = "Route A",
-                                .projectKind = 2,
-                                .treePath = treePath,
-                                .unit = unit,
-                                .unitPrice = unitPrice};
+        return Line(label, 3, "\"PRJ_SFC_MAT_Enrobé\"", "Route A", 2, treePath, unit, unitPrice);
     };
     lines = {paving("Bon", kPavingPath, "m²", 12), paving("Gratuit", kPavingPath, "m²", 0.004),
              paving("Sans unité", kPavingPath, " ", 12), paving("Inconnu", "X\\\\Y-1 - Inconnu", "m²", 12),
@@ -277,11 +263,7 @@ TEST_F(EstimateTest, CsvCells)
     };
     EXPECT_EQ(rows, expected);
 
-    lines = {{.label = "Bordure \"T2\"; pose",
-              .lineKind = 5,
-              .projects = "**Forfait",
-              .treePath = kTestsPath,
-              .unitPrice = 1}};
+    lines = {Line("Bordure \"T2\"; pose", 5, "", "**Forfait", 0, kTestsPath, "", 1)};
     const std::string quoted = metre::EstimateCsv(Build());
     EXPECT_NE(quoted.find("DV-001;\"Bordure \"\"T2\"\"; pose\";"), std::string::npos) << quoted;
 }

@@ -28,6 +28,24 @@ Fn* Function(const char* name)
     return reinterpret_cast<Fn*>(acrxGetServiceSymbolAddr(kZodEVIServiceName, name));
 }
 
+// The service's functions, looked up by name each time the module is loaded (it may come
+// back at another address).
+struct Api {
+    ZodEVI_GetBdrPriceFn* getPrice = Function<ZodEVI_GetBdrPriceFn>("ZodEVI_GetBdrPrice");
+    ZodEVI_SetBdrPriceFn* setPrice = Function<ZodEVI_SetBdrPriceFn>("ZodEVI_SetBdrPrice");
+    ZodEVI_GetBdrPriceRsxFn* getPrices = Function<ZodEVI_GetBdrPriceRsxFn>("ZodEVI_GetBdrPriceRsx");
+    ZodEVI_ShowBdrPriceFn* show = Function<ZodEVI_ShowBdrPriceFn>("ZodEVI_ShowBdrPrice");
+    ZodEVI_WriteBdrFn* write = Function<ZodEVI_WriteBdrFn>("ZodEVI_WriteBdr");
+    ZodEVI_ReadBdrFn* read = Function<ZodEVI_ReadBdrFn>("ZodEVI_ReadBdr");
+    ZodEVI_UpdateBdrRsxFn* rsx = Function<ZodEVI_UpdateBdrRsxFn>("ZodEVI_UpdateBdrRsx");
+    ZodEVI_UpdateBdrTnePfFn* depth = Function<ZodEVI_UpdateBdrTnePfFn>("ZodEVI_UpdateBdrTnePf");
+    ZodEVI_UpdateBdrPgnFn* comb = Function<ZodEVI_UpdateBdrPgnFn>("ZodEVI_UpdateBdrPgn");
+    ZodEVI_UpdateBdrMatFn* materials = Function<ZodEVI_UpdateBdrMatFn>("ZodEVI_UpdateBdrMat");
+    ZodEVI_UpdateBdrEpDcpFn* stripping = Function<ZodEVI_UpdateBdrEpDcpFn>("ZodEVI_UpdateBdrEpDcp");
+    ZodEVI_UpdateBdrEpVegFn* vegetation = Function<ZodEVI_UpdateBdrEpVegFn>("ZodEVI_UpdateBdrEpVeg");
+    ZodEVI_UpdateBdrEpRbtFn* planing = Function<ZodEVI_UpdateBdrEpRbtFn>("ZodEVI_UpdateBdrEpRbt");
+};
+
 class ModuleApi : public ::testing::Test {
 protected:
     void SetUp() override
@@ -37,6 +55,9 @@ protected:
         velHostSettings().profileDir = dir.File("profil");
         ASSERT_TRUE(acrxLoadModule((fs::path(VEL_MODULE_DIR) / kZodEVIModuleFile).c_str(), false));
         ASSERT_TRUE(acrxServiceIsRegistered(kZodEVIServiceName));
+        api = Api{};
+        ASSERT_TRUE(api.getPrice && api.setPrice && api.getPrices && api.show && api.write && api.read && api.rsx &&
+                    api.depth && api.comb && api.materials && api.stripping && api.vegetation && api.planing);
     }
     void TearDown() override
     {
@@ -48,8 +69,7 @@ protected:
                                const CZodEVIRealArray& bounds = {})
     {
         const CZodEVIStringList none;
-        return Function<ZodEVI_UpdateBdrRsxFn>("ZodEVI_UpdateBdrRsx")(&index, &name, &models, &none, &none, &none,
-                                                                      &none, &none, &bounds);
+        return api.rsx(&index, &name, &models, &none, &none, &none, &none, &none, &bounds);
     }
 
     // Loads the module again, so that it reads the schedule file as it is now.
@@ -57,6 +77,7 @@ protected:
     {
         velUnloadAllModules();
         ASSERT_TRUE(acrxLoadModule((fs::path(VEL_MODULE_DIR) / kZodEVIModuleFile).c_str(), false));
+        api = Api{};
     }
     std::string SchedulePath() const { return dir.File("profil/Donnees/VelaBordereau.xml"); }
     std::string Schedule() const { return dir.Read("profil/Donnees/VelaBordereau.xml"); }
@@ -73,43 +94,37 @@ protected:
     TempDir dir;
     VelHostSettings saved;
     ScriptedSession session;
+    Api api;
 };
 
 TEST_F(ModuleApi, PricesThroughUpdateSetWriteAndRead)
 {
-    auto* getPrice = Function<ZodEVI_GetBdrPriceFn>("ZodEVI_GetBdrPrice");
-    auto* setPrice = Function<ZodEVI_SetBdrPriceFn>("ZodEVI_SetBdrPrice");
-    auto* getPrices = Function<ZodEVI_GetBdrPriceRsxFn>("ZodEVI_GetBdrPriceRsx");
-    auto* write = Function<ZodEVI_WriteBdrFn>("ZodEVI_WriteBdr");
-    auto* read = Function<ZodEVI_ReadBdrFn>("ZodEVI_ReadBdr");
-    ASSERT_TRUE(getPrice && setPrice && getPrices && write && read);
-
     const std::int32_t pipeLength = kZodEVIPipeLength;
     const std::string pvc = "PVC 200";
     double price = 99;
-    EXPECT_EQ(getPrice(&pipeLength, &pvc, &price, "EU 1"), kZodEVINotFound);
+    EXPECT_EQ(api.getPrice(&pipeLength, &pvc, &price, "EU 1"), kZodEVINotFound);
     EXPECT_EQ(price, 0.0);
 
     EXPECT_EQ(UpdateNetwork(1, "EU 1", {"PVC 200"}, {1.3, 2.0}), kZodEVIOk);
     EXPECT_EQ(UpdateNetwork(1, "EU 1", {"PVC 200"}, {1.3, 2.0}), kZodEVIFailed); // nothing new
 
     const double set = 48.5;
-    EXPECT_EQ(setPrice(&pipeLength, &pvc, &set, "EU 1"), kZodEVIOk);
-    EXPECT_EQ(getPrice(&pipeLength, &pvc, &price, "EU 1"), kZodEVIOk);
+    EXPECT_EQ(api.setPrice(&pipeLength, &pvc, &set, "EU 1"), kZodEVIOk);
+    EXPECT_EQ(api.getPrice(&pipeLength, &pvc, &price, "EU 1"), kZodEVIOk);
     EXPECT_EQ(price, 48.5);
-    EXPECT_EQ(setPrice(&pipeLength, &pvc, &set, "EU 2"), kZodEVIFailed);
+    EXPECT_EQ(api.setPrice(&pipeLength, &pvc, &set, "EU 2"), kZodEVIFailed);
 
     // Per network, for the networks the updates named.
     CZodEVIStringMap prices;
-    EXPECT_EQ(getPrices(&pipeLength, &pvc, &prices), kZodEVIOk);
+    EXPECT_EQ(api.getPrices(&pipeLength, &pvc, &prices), kZodEVIOk);
     EXPECT_EQ(prices["EU 1"], "48.5");
 
-    EXPECT_EQ(write(), kZodEVIOk);
+    EXPECT_EQ(api.write(), kZodEVIOk);
     EXPECT_TRUE(fs::exists(dir.File("profil/Donnees/VelaBordereau.xml")));
     const double other = 1;
-    setPrice(&pipeLength, &pvc, &other, "EU 1");
-    EXPECT_EQ(read(), kZodEVIOk);
-    EXPECT_EQ(getPrice(&pipeLength, &pvc, &price, "EU 1"), kZodEVIOk);
+    api.setPrice(&pipeLength, &pvc, &other, "EU 1");
+    EXPECT_EQ(api.read(), kZodEVIOk);
+    EXPECT_EQ(api.getPrice(&pipeLength, &pvc, &price, "EU 1"), kZodEVIOk);
     EXPECT_EQ(price, 48.5);
 }
 
@@ -117,12 +132,8 @@ TEST_F(ModuleApi, PricesThroughUpdateSetWriteAndRead)
 // failed read leaves the schedule empty, and the file stays as it was.
 TEST_F(ModuleApi, ReadAndWriteWithoutTheMetreModule)
 {
-    auto* getPrice = Function<ZodEVI_GetBdrPriceFn>("ZodEVI_GetBdrPrice");
-    auto* write = Function<ZodEVI_WriteBdrFn>("ZodEVI_WriteBdr");
-    auto* read = Function<ZodEVI_ReadBdrFn>("ZodEVI_ReadBdr");
-    ASSERT_TRUE(getPrice && write && read);
     ASSERT_EQ(UpdateNetwork(1, "EU 1", {"PVC 200"}), kZodEVIOk);
-    ASSERT_EQ(write(), kZodEVIOk);
+    ASSERT_EQ(api.write(), kZodEVIOk);
     const std::string written = Schedule();
 
     ASSERT_TRUE(acrxUnloadModule("VelMetre15.arx"));
@@ -130,35 +141,21 @@ TEST_F(ModuleApi, ReadAndWriteWithoutTheMetreModule)
     const std::int32_t pipeLength = kZodEVIPipeLength;
     const std::string pvc = "PVC 200";
     double price = 1;
-    EXPECT_EQ(write(), kZodEVIFailed);
-    EXPECT_EQ(getPrice(&pipeLength, &pvc, &price, "EU 1"), kZodEVIOk);
-    EXPECT_EQ(read(), kZodEVIFailed);
-    EXPECT_EQ(getPrice(&pipeLength, &pvc, &price, "EU 1"), kZodEVINotFound);
-    EXPECT_EQ(write(), kZodEVIFailed);
+    EXPECT_EQ(api.write(), kZodEVIFailed);
+    EXPECT_EQ(api.getPrice(&pipeLength, &pvc, &price, "EU 1"), kZodEVIOk);
+    EXPECT_EQ(api.read(), kZodEVIFailed);
+    EXPECT_EQ(api.getPrice(&pipeLength, &pvc, &price, "EU 1"), kZodEVINotFound);
+    EXPECT_EQ(api.write(), kZodEVIFailed);
     EXPECT_EQ(Schedule(), written);
 }
 
 TEST_F(ModuleApi, BadArgumentsAnswerAStatusAndChangeNothing)
 {
-    auto* getPrice = Function<ZodEVI_GetBdrPriceFn>("ZodEVI_GetBdrPrice");
-    auto* setPrice = Function<ZodEVI_SetBdrPriceFn>("ZodEVI_SetBdrPrice");
-    auto* getPrices = Function<ZodEVI_GetBdrPriceRsxFn>("ZodEVI_GetBdrPriceRsx");
-    auto* show = Function<ZodEVI_ShowBdrPriceFn>("ZodEVI_ShowBdrPrice");
-    auto* rsx = Function<ZodEVI_UpdateBdrRsxFn>("ZodEVI_UpdateBdrRsx");
-    auto* depth = Function<ZodEVI_UpdateBdrTnePfFn>("ZodEVI_UpdateBdrTnePf");
-    auto* comb = Function<ZodEVI_UpdateBdrPgnFn>("ZodEVI_UpdateBdrPgn");
-    auto* materials = Function<ZodEVI_UpdateBdrMatFn>("ZodEVI_UpdateBdrMat");
-    auto* stripping = Function<ZodEVI_UpdateBdrEpDcpFn>("ZodEVI_UpdateBdrEpDcp");
-    auto* vegetation = Function<ZodEVI_UpdateBdrEpVegFn>("ZodEVI_UpdateBdrEpVeg");
-    auto* planing = Function<ZodEVI_UpdateBdrEpRbtFn>("ZodEVI_UpdateBdrEpRbt");
-    ASSERT_TRUE(getPrice && setPrice && getPrices && show && rsx && depth && comb && materials && stripping &&
-                vegetation && planing);
-
     ASSERT_EQ(UpdateNetwork(0, "EP", {"Fonte 150"}), kZodEVIOk);
     const std::int32_t selector = kZodEVIPipeLength;
     const std::string item = "Fonte 150";
     const double good = 10;
-    ASSERT_EQ(setPrice(&selector, &item, &good, "EP"), kZodEVIOk);
+    ASSERT_EQ(api.setPrice(&selector, &item, &good, "EP"), kZodEVIOk);
 
     const CZodEVIStringList list;
     const CZodEVIRealArray values;
@@ -175,38 +172,38 @@ TEST_F(ModuleApi, BadArgumentsAnswerAStatusAndChangeNothing)
         std::int32_t status;
     };
     const Case cases[] = {
-        {"rsx index", rsx(nullptr, &name, &list, &list, &list, &list, &list, &list, &values)},
-        {"rsx name", rsx(&index, nullptr, &list, &list, &list, &list, &list, &list, &values)},
-        {"rsx list", rsx(&index, &name, &list, &list, &list, nullptr, &list, &list, &values)},
-        {"rsx bounds", rsx(&index, &name, &list, &list, &list, &list, &list, &list, nullptr)},
-        {"depth", depth(nullptr)},
-        {"comb", comb(nullptr)},
-        {"materials", materials(&list, nullptr, &list)},
-        {"stripping", stripping(nullptr)},
-        {"vegetation", vegetation(nullptr)},
-        {"planing", planing(nullptr)},
-        {"set selector", setPrice(nullptr, &item, &good, "EP")},
-        {"set item", setPrice(&selector, nullptr, &good, "EP")},
-        {"set price", setPrice(&selector, &item, nullptr, "EP")},
-        {"set nan", setPrice(&selector, &item, &nan, "EP")},
-        {"set infinite", setPrice(&selector, &item, &infinite, "EP")},
-        {"set selector out of range", setPrice(&outOfRange, &item, &good, "EP")},
-        {"set negative selector", setPrice(&negative, &item, &good, "EP")},
-        {"show selector", show(nullptr, &item, "EP")},
-        {"show item", show(&selector, nullptr, "EP")},
+        {"rsx index", api.rsx(nullptr, &name, &list, &list, &list, &list, &list, &list, &values)},
+        {"rsx name", api.rsx(&index, nullptr, &list, &list, &list, &list, &list, &list, &values)},
+        {"rsx list", api.rsx(&index, &name, &list, &list, &list, nullptr, &list, &list, &values)},
+        {"rsx bounds", api.rsx(&index, &name, &list, &list, &list, &list, &list, &list, nullptr)},
+        {"depth", api.depth(nullptr)},
+        {"comb", api.comb(nullptr)},
+        {"materials", api.materials(&list, nullptr, &list)},
+        {"stripping", api.stripping(nullptr)},
+        {"vegetation", api.vegetation(nullptr)},
+        {"planing", api.planing(nullptr)},
+        {"set selector", api.setPrice(nullptr, &item, &good, "EP")},
+        {"set item", api.setPrice(&selector, nullptr, &good, "EP")},
+        {"set price", api.setPrice(&selector, &item, nullptr, "EP")},
+        {"set nan", api.setPrice(&selector, &item, &nan, "EP")},
+        {"set infinite", api.setPrice(&selector, &item, &infinite, "EP")},
+        {"set selector out of range", api.setPrice(&outOfRange, &item, &good, "EP")},
+        {"set negative selector", api.setPrice(&negative, &item, &good, "EP")},
+        {"show selector", api.show(nullptr, &item, "EP")},
+        {"show item", api.show(&selector, nullptr, "EP")},
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.name);
         EXPECT_EQ(c.status, kZodEVIFailed);
     }
     const Case queries[] = {
-        {"get selector", getPrice(nullptr, &item, &price, "EP")},
-        {"get item", getPrice(&selector, nullptr, &price, "EP")},
-        {"get price", getPrice(&selector, &item, nullptr, "EP")},
-        {"get out of range", getPrice(&outOfRange, &item, &price, "EP")},
-        {"prices selector", getPrices(nullptr, &item, &prices)},
-        {"prices map", getPrices(&selector, &item, nullptr)},
-        {"prices out of range", getPrices(&outOfRange, &item, &prices)},
+        {"get selector", api.getPrice(nullptr, &item, &price, "EP")},
+        {"get item", api.getPrice(&selector, nullptr, &price, "EP")},
+        {"get price", api.getPrice(&selector, &item, nullptr, "EP")},
+        {"get out of range", api.getPrice(&outOfRange, &item, &price, "EP")},
+        {"prices selector", api.getPrices(nullptr, &item, &prices)},
+        {"prices map", api.getPrices(&selector, &item, nullptr)},
+        {"prices out of range", api.getPrices(&outOfRange, &item, &prices)},
     };
     for (const Case& c : queries) {
         SCOPED_TRACE(c.name);
@@ -214,36 +211,28 @@ TEST_F(ModuleApi, BadArgumentsAnswerAStatusAndChangeNothing)
     }
     EXPECT_TRUE(prices.empty()) << "a refused query leaves no stale price behind";
     // Nothing above touched the price.
-    EXPECT_EQ(getPrice(&selector, &item, &price, "EP"), kZodEVIOk);
+    EXPECT_EQ(api.getPrice(&selector, &item, &price, "EP"), kZodEVIOk);
     EXPECT_EQ(price, 10.0);
 }
 
 TEST_F(ModuleApi, UnusualNamesAndValuesAreData)
 {
-    auto* depth = Function<ZodEVI_UpdateBdrTnePfFn>("ZodEVI_UpdateBdrTnePf");
-    auto* getPrice = Function<ZodEVI_GetBdrPriceFn>("ZodEVI_GetBdrPrice");
     const std::string longName(10000, 'x');
     const std::string odd = "PVC %s%n \"200\" \\ 50%";
     EXPECT_EQ(UpdateNetwork(1, "EU %d", {odd, longName}, {2.0, 1.3, 1.3, std::nan("")}), kZodEVIOk);
     const CZodEVIRealArray bounds{3.5, -1.0};
-    EXPECT_EQ(depth(&bounds), kZodEVIOk);
+    EXPECT_EQ(api.depth(&bounds), kZodEVIOk);
     // Only the low 16 bits of the index choose the texts: 65537 is EU, 70000 is no network.
     EXPECT_EQ(UpdateNetwork(70000, "Autre", {"Câble 3x2.5"}), kZodEVIFailed);
     EXPECT_EQ(UpdateNetwork(65537, "Autre", {"Câble 3x2.5"}), kZodEVIOk);
     const std::int32_t selector = kZodEVIPipeLength;
     double price = 1;
-    EXPECT_EQ(getPrice(&selector, &odd, &price, "EU %d"), kZodEVIOk);
-    EXPECT_EQ(getPrice(&selector, &longName, &price, "EU %d"), kZodEVIOk);
+    EXPECT_EQ(api.getPrice(&selector, &odd, &price, "EU %d"), kZodEVIOk);
+    EXPECT_EQ(api.getPrice(&selector, &longName, &price, "EU %d"), kZodEVIOk);
 }
 
 TEST_F(ModuleApi, RoadAndEarthworkUpdatesAnswerWhetherTheyChangedSomething)
 {
-    auto* comb = Function<ZodEVI_UpdateBdrPgnFn>("ZodEVI_UpdateBdrPgn");
-    auto* materials = Function<ZodEVI_UpdateBdrMatFn>("ZodEVI_UpdateBdrMat");
-    auto* stripping = Function<ZodEVI_UpdateBdrEpDcpFn>("ZodEVI_UpdateBdrEpDcp");
-    auto* vegetation = Function<ZodEVI_UpdateBdrEpVegFn>("ZodEVI_UpdateBdrEpVeg");
-    auto* planing = Function<ZodEVI_UpdateBdrEpRbtFn>("ZodEVI_UpdateBdrEpRbt");
-    auto* depth = Function<ZodEVI_UpdateBdrTnePfFn>("ZodEVI_UpdateBdrTnePf");
     const CZodEVIStringList combs{"PEHD 4x45"}, volumes{"Grave"}, surfaces{"Enrobé"}, lengths{"Bordure T2"};
     const CZodEVIRealArray thicknesses{0.3}, limits{0.05, 0.1};
     ASSERT_EQ(UpdateNetwork(1, "EU 1", {"PVC 200"}), kZodEVIOk);
@@ -253,12 +242,12 @@ TEST_F(ModuleApi, RoadAndEarthworkUpdatesAnswerWhetherTheyChangedSomething)
         std::function<std::int32_t()> call;
     };
     const Case cases[] = {
-        {"comb ducts", [&] { return comb(&combs); }},
-        {"materials", [&] { return materials(&volumes, &surfaces, &lengths); }},
-        {"stripping", [&] { return stripping(&thicknesses); }},
-        {"vegetation", [&] { return vegetation(&thicknesses); }},
-        {"planing", [&] { return planing(&limits); }},
-        {"depth classes", [&] { return depth(&bounds); }},
+        {"comb ducts", [&] { return api.comb(&combs); }},
+        {"materials", [&] { return api.materials(&volumes, &surfaces, &lengths); }},
+        {"stripping", [&] { return api.stripping(&thicknesses); }},
+        {"vegetation", [&] { return api.vegetation(&thicknesses); }},
+        {"planing", [&] { return api.planing(&limits); }},
+        {"depth classes", [&] { return api.depth(&bounds); }},
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.name);
@@ -269,17 +258,12 @@ TEST_F(ModuleApi, RoadAndEarthworkUpdatesAnswerWhetherTheyChangedSomething)
 
 TEST_F(ModuleApi, UnreadableScheduleIsNeverWrittenOver)
 {
-    auto* write = Function<ZodEVI_WriteBdrFn>("ZodEVI_WriteBdr");
-    auto* show = Function<ZodEVI_ShowBdrPriceFn>("ZodEVI_ShowBdrPrice");
     ASSERT_EQ(UpdateNetwork(0, "EP", {"PVC 200"}), kZodEVIOk);
-    ASSERT_EQ(write(), kZodEVIOk);
+    ASSERT_EQ(api.write(), kZodEVIOk);
     const std::string whole = Schedule();
     const std::string cut = whole.substr(0, whole.size() / 2);
     dir.Write("profil/Donnees/VelaBordereau.xml", cut);
     Reload();
-    // The module may come back at another address: its functions are looked up again.
-    write = Function<ZodEVI_WriteBdrFn>("ZodEVI_WriteBdr");
-    show = Function<ZodEVI_ShowBdrPriceFn>("ZodEVI_ShowBdrPrice");
     session.ClearOutput();
 
     // Updates still run in memory; nothing reaches the file, each time with the reason.
@@ -287,8 +271,8 @@ TEST_F(ModuleApi, UnreadableScheduleIsNeverWrittenOver)
     const std::int32_t selector = kZodEVIPipeLength;
     const std::string item = "Fonte 150";
     for (int attempt = 0; attempt < 2; ++attempt) {
-        EXPECT_EQ(write(), kZodEVIFailed);
-        EXPECT_EQ(show(&selector, &item, "EP"), kZodEVIFailed);
+        EXPECT_EQ(api.write(), kZodEVIFailed);
+        EXPECT_EQ(api.show(&selector, &item, "EP"), kZodEVIFailed);
     }
     EXPECT_EQ(Schedule(), cut);
     EXPECT_FALSE(fs::exists(SchedulePath() + ".bak"));
@@ -299,7 +283,7 @@ TEST_F(ModuleApi, UnreadableScheduleIsNeverWrittenOver)
 
     // Repaired, it is read again at the next write, which makes the update on it.
     dir.Write("profil/Donnees/VelaBordereau.xml", whole);
-    EXPECT_EQ(write(), kZodEVIOk) << session.Output();
+    EXPECT_EQ(api.write(), kZodEVIOk) << session.Output();
     const std::string now = Schedule();
     EXPECT_NE(now.find("PVC 200"), std::string::npos);
     EXPECT_NE(now.find("Fonte 150"), std::string::npos);
@@ -307,10 +291,6 @@ TEST_F(ModuleApi, UnreadableScheduleIsNeverWrittenOver)
 
 TEST_F(ModuleApi, ScheduleChangedByAnotherUserIsNotOverwrittenSilently)
 {
-    auto* write = Function<ZodEVI_WriteBdrFn>("ZodEVI_WriteBdr");
-    auto* read = Function<ZodEVI_ReadBdrFn>("ZodEVI_ReadBdr");
-    auto* setPrice = Function<ZodEVI_SetBdrPriceFn>("ZodEVI_SetBdrPrice");
-    auto* getPrice = Function<ZodEVI_GetBdrPriceFn>("ZodEVI_GetBdrPrice");
     const std::int32_t selector = kZodEVIPipeLength;
     const std::string pvc = "PVC 200", cast = "Fonte 150";
     struct Case {
@@ -327,22 +307,22 @@ TEST_F(ModuleApi, ScheduleChangedByAnotherUserIsNotOverwrittenSilently)
     for (const Case& c : cases) {
         SCOPED_TRACE(c.name);
         fs::remove(SchedulePath());
-        ASSERT_EQ(read(), kZodEVIFailed) << "no file yet";
+        ASSERT_EQ(api.read(), kZodEVIFailed) << "no file yet";
         ASSERT_EQ(UpdateNetwork(0, "EP", {"PVC 200", "Fonte 150"}), kZodEVIOk);
-        ASSERT_EQ(write(), kZodEVIOk);
+        ASSERT_EQ(api.write(), kZodEVIOk);
         ChangePriceOnDisk("0", "77"); // the first price of the file: another user's work
         const std::string theirs = Schedule();
         const double mine = 31.5;
-        ASSERT_EQ(setPrice(&selector, &pvc, &mine, "EP"), kZodEVIOk);
+        ASSERT_EQ(api.setPrice(&selector, &pvc, &mine, "EP"), kZodEVIOk);
         session.ClearOutput();
         std::int32_t status = 0;
         std::string shown;
         if (c.answers == nullptr) {
-            status = write();
+            status = api.write();
             shown = session.Output();
         } else {
             TerminalAnswers user(c.answers);
-            status = write();
+            status = api.write();
             shown = user.output.str();
         }
         EXPECT_EQ(status, c.status) << shown;
@@ -353,23 +333,20 @@ TEST_F(ModuleApi, ScheduleChangedByAnotherUserIsNotOverwrittenSilently)
             EXPECT_EQ(Schedule(), theirs);
             continue;
         }
-        ASSERT_EQ(read(), kZodEVIOk);
+        ASSERT_EQ(api.read(), kZodEVIOk);
         double price = 0;
-        EXPECT_EQ(getPrice(&selector, &pvc, &price, "EP"), kZodEVIOk);
+        EXPECT_EQ(api.getPrice(&selector, &pvc, &price, "EP"), kZodEVIOk);
         EXPECT_EQ(price, 31.5);
         EXPECT_EQ(Schedule().find("unitPrice=\"77\"") != std::string::npos, c.theirsKept);
-        EXPECT_EQ(getPrice(&selector, &cast, &price, "EP"), kZodEVIOk);
+        EXPECT_EQ(api.getPrice(&selector, &cast, &price, "EP"), kZodEVIOk);
     }
 }
 
 TEST_F(ModuleApi, ScheduleWriteThatFailsAnywhereLeavesThePreviousFile)
 {
-    auto* write = Function<ZodEVI_WriteBdrFn>("ZodEVI_WriteBdr");
-    auto* read = Function<ZodEVI_ReadBdrFn>("ZodEVI_ReadBdr");
-    auto* setPrice = Function<ZodEVI_SetBdrPriceFn>("ZodEVI_SetBdrPrice");
     ASSERT_EQ(UpdateNetwork(0, "EP", {"PVC 200"}), kZodEVIOk);
-    ASSERT_EQ(write(), kZodEVIOk);
-    ASSERT_EQ(write(), kZodEVIOk);
+    ASSERT_EQ(api.write(), kZodEVIOk);
+    ASSERT_EQ(api.write(), kZodEVIOk);
     const std::string previous = Schedule(), backup = dir.Read("profil/Donnees/VelaBordereau.xml.bak");
     const std::int32_t selector = kZodEVIPipeLength;
     const std::string pvc = "PVC 200";
@@ -379,11 +356,11 @@ TEST_F(ModuleApi, ScheduleWriteThatFailsAnywhereLeavesThePreviousFile)
         [&] {
             dir.Write("profil/Donnees/VelaBordereau.xml", previous);
             dir.Write("profil/Donnees/VelaBordereau.xml.bak", backup);
-            ASSERT_EQ(read(), kZodEVIOk);
-            ASSERT_EQ(setPrice(&selector, &pvc, &price, "EP"), kZodEVIOk);
+            ASSERT_EQ(api.read(), kZodEVIOk);
+            ASSERT_EQ(api.setPrice(&selector, &pvc, &price, "EP"), kZodEVIOk);
             session.ClearOutput();
         },
-        [&] { status = write(); },
+        [&] { status = api.write(); },
         [&](const FaultRun& run) {
             SCOPED_TRACE(run.failed + " n° " + std::to_string(run.calls));
             if (run.committed) {
@@ -410,10 +387,8 @@ TEST_F(ModuleApi, ScheduleWriteThatFailsAnywhereLeavesThePreviousFile)
 
 TEST_F(ModuleApi, ShowPriceAnswersOkWhenTheEditorClosesNormally)
 {
-    auto* show = Function<ZodEVI_ShowBdrPriceFn>("ZodEVI_ShowBdrPrice");
-    auto* write = Function<ZodEVI_WriteBdrFn>("ZodEVI_WriteBdr");
     ASSERT_EQ(UpdateNetwork(0, "EP", {"PVC 200"}), kZodEVIOk);
-    ASSERT_EQ(write(), kZodEVIOk);
+    ASSERT_EQ(api.write(), kZodEVIOk);
     const std::int32_t selector = kZodEVIPipeLength;
     const std::string pvc = "PVC 200";
     struct Case {
@@ -428,7 +403,7 @@ TEST_F(ModuleApi, ShowPriceAnswersOkWhenTheEditorClosesNormally)
         SCOPED_TRACE(c.name);
         session.input.clear();
         session.input.str(c.script);
-        EXPECT_EQ(show(&selector, &pvc, "EP"), c.status) << session.Output();
+        EXPECT_EQ(api.show(&selector, &pvc, "EP"), c.status) << session.Output();
     }
 }
 

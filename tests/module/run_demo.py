@@ -6,28 +6,21 @@ drawing's records and the schedule's prices.
 usage: run_demo.py VELHOST MODULES_DIR EXAMPLES_DIR WORK_DIR
 """
 import os
-import shutil
-import subprocess
 import sys
 import xml.etree.ElementTree as ET
 
 from estimate_totals import expected_total, workbook_total
+sys.path.insert(0, os.path.join(os.path.dirname(os.path.abspath(__file__)), "..", "support"))
+from velrun import fresh_folder, report, run_velhost  # noqa: E402
 
 
 def main():
     velhost, modules, examples, work = (os.path.abspath(a) for a in sys.argv[1:5])
-    shutil.rmtree(work, ignore_errors=True)
-    os.makedirs(work)
-    for name in ("projet_vrd.dxf", "VelaBordereau.xml"):
-        shutil.copy(os.path.join(examples, name), work)
-    run = subprocess.run(
-        [velhost, "--modules", modules, "--profile", os.path.join(work, "profil"),
-         "--script", os.path.join(examples, "demo.scr"), "projet_vrd.dxf"],
-        cwd=work, capture_output=True, text=True, timeout=300)
-    output = run.stdout + run.stderr
+    fresh_folder(work, examples, ("projet_vrd.dxf", "VelaBordereau.xml"))
+    returncode, output = run_velhost(velhost, modules, work, os.path.join(examples, "demo.scr"), ["projet_vrd.dxf"])
     failures = []
-    if run.returncode != 0:
-        failures.append(f"exit status {run.returncode}")
+    if returncode != 0:
+        failures.append(f"exit status {returncode}")
     for text in ("Réseau EP, projet « EP Les Tilleuls »", "Réseau EU, projet « EU Les Tilleuls »",
                  "Prix unitaire de « PVC 315 » : 72.50 € HT.", "Bordereau des prix enregistré.",
                  "VelVuzazORE15 : VelaZodEVIBdrPrix", "Dessin enregistré"):
@@ -55,11 +48,7 @@ def main():
             shown = workbook_total(os.path.join(work, name + ".xlsx"))
             if shown is None or abs(shown - expected) > 0.005:
                 failures.append(f"{name}.xlsx: Total HT {shown}, expected {expected} from the drawing and the prices")
-    if failures:
-        print(output)
-        print("\n".join(failures))
-        return 1
-    return 0
+    return report(output, failures)
 
 
 if __name__ == "__main__":

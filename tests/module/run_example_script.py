@@ -8,30 +8,21 @@ usage: run_example_script.py VELHOST MODULES_DIR EXAMPLES_DIR WORK_DIR SCRIPT EX
 EXPECTED holds texts that must appear in the output in that order ("#" starts a comment).
 """
 import os
-import shutil
-import subprocess
 import sys
 import xml.etree.ElementTree as ET
 
-sys.path.insert(0, os.path.join(os.path.dirname(os.path.abspath(__file__)), "..", "apps"))
-from run_script import missing_texts  # noqa: E402
+sys.path.insert(0, os.path.join(os.path.dirname(os.path.abspath(__file__)), "..", "support"))
+from velrun import fresh_folder, missing_texts, report, run_velhost  # noqa: E402
 
 
 def main():
     velhost, modules, examples, work, script, expected = (os.path.abspath(a) for a in sys.argv[1:7])
     checks = sys.argv[7:]
-    shutil.rmtree(work, ignore_errors=True)
-    os.makedirs(work)
-    for name in ("projet_vrd.dxf", "VelaBordereau.xml"):
-        shutil.copy(os.path.join(examples, name), work)
-    run = subprocess.run(
-        [velhost, "--modules", modules, "--profile", os.path.join(work, "profil"), "--script", script,
-         "projet_vrd.dxf"],
-        cwd=work, capture_output=True, text=True, timeout=300)
-    output = run.stdout + run.stderr
+    fresh_folder(work, examples, ("projet_vrd.dxf", "VelaBordereau.xml"))
+    returncode, output = run_velhost(velhost, modules, work, script, ["projet_vrd.dxf"])
     failures = []
-    if run.returncode != 0:
-        failures.append(f"exit status {run.returncode}")
+    if returncode != 0:
+        failures.append(f"exit status {returncode}")
     failures += missing_texts(output, expected)
     articles = {a.get("treePath"): a for a in
                 ET.parse(os.path.join(work, "VelaBordereau.xml")).getroot().iter("article")}
@@ -57,11 +48,7 @@ def main():
         else:
             failures.append(f"unknown check {checks[i]}")
             break
-    if failures:
-        print(output)
-        print("\n".join(failures))
-        return 1
-    return 0
+    return report(output, failures)
 
 
 if __name__ == "__main__":

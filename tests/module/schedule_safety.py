@@ -16,15 +16,15 @@ import sys
 import threading
 import time
 
+sys.path.insert(0, os.path.join(os.path.dirname(os.path.abspath(__file__)), "..", "support"))
+from velrun import fresh_folder, report, run_velhost  # noqa: E402
+
 SKIPPED = 77
 LOAD = "APPLOAD VelVuzazORE15.arx\nAPPLOAD VelReseDimVRD15.arx\nRsxMetres\n"
 
 
 def prepare(examples, work):
-    shutil.rmtree(work, ignore_errors=True)
-    os.makedirs(work)
-    for name in ("projet_vrd.dxf", "VelaBordereau.xml"):
-        shutil.copy(os.path.join(examples, name), work)
+    fresh_folder(work, examples, ("projet_vrd.dxf", "VelaBordereau.xml"))
 
 
 def read(path):
@@ -38,11 +38,7 @@ def velhost(args, work, profile, script, extra=()):
     path = os.path.join(os.path.dirname(work), os.path.basename(work) + "_" + profile + ".scr")
     with open(path, "w", encoding="utf-8") as f:
         f.write(script)
-    run = subprocess.run(
-        [args.velhost, "--modules", args.modules, "--profile", os.path.join(work, profile), "--script", path]
-        + list(extra) + ["projet_vrd.dxf"],
-        cwd=work, capture_output=True, text=True, timeout=300)
-    return run.returncode, run.stdout + run.stderr
+    return run_velhost(args.velhost, args.modules, work, path, list(extra) + ["projet_vrd.dxf"], profile)
 
 
 class Args:
@@ -220,11 +216,7 @@ def main():
     else:
         failures.append(f"unknown scenario {args.scenario}")
         output = ""
-    if failures:
-        print(output)
-        print("\n".join(failures))
-        return 1
-    return 0
+    return report(output, failures)
 
 
 if __name__ == "__main__":

@@ -23,6 +23,14 @@ using namespace zodevi;
 
 namespace {
 
+// An article of the metre module's file, filed under its group key.
+CZodEVIArticle Filed(const std::string& code, double unitPrice, const std::string& quantityKey,
+                     const std::string& groupKey, const std::string& treePath)
+{
+    return {
+        .code = code, .unitPrice = unitPrice, .quantityKey = quantityKey, .groupKey = groupKey, .treePath = treePath};
+}
+
 // A metre module whose file and answers each test sets.
 struct FakeMetre final : CZodEVIBdrMetre {
     std::int32_t FillTable(const std::string& path, std::vector<CZodEVIArticle*>& table) override
@@ -151,12 +159,9 @@ TEST_F(ScheduleExchange, ReadWithCutVolumeAddsOnlyFillAndSawing)
 
 TEST_F(ScheduleExchange, FailedPartialReadLeavesStoreEmpty)
 {
-    fake.file = {
-        CZodEVIArticle{
-            .code = "A-001", .quantityKey = "\"A\"", .groupKey = "PRJ_RES(EU1)", .treePath = "X\\\\A-001 - A"},
-        CZodEVIArticle{
-            .code = "A-002", .quantityKey = "\"B\"", .groupKey = "PRJ_RES(EU1)", .treePath = "X\\\\A-002 - B"},
-        CZodEVIArticle{.code = "A-003", .quantityKey = "\"C\"", .groupKey = "0", .treePath = "X\\\\A-003 - C"}};
+    fake.file = {Filed("A-001", 0, "\"A\"", "PRJ_RES(EU1)", "X\\\\A-001 - A"),
+                 Filed("A-002", 0, "\"B\"", "PRJ_RES(EU1)", "X\\\\A-002 - B"),
+                 Filed("A-003", 0, "\"C\"", "0", "X\\\\A-003 - C")};
     fake.failAfterPartialRead = true;
     EXPECT_FALSE(Read(bdr));
     EXPECT_TRUE(bdr.Articles().empty());
@@ -251,15 +256,8 @@ TEST_F(ScheduleExchange, PricesBySelector)
 
 TEST_F(ScheduleExchange, EmptyNetworkMeansGeneralForGetPriceButEveryGroupForShowPrice)
 {
-    fake.file = {CZodEVIArticle{.code = "EU-001",
-                                .quantityKey = "\"RSX_FRX_NB_Té\"",
-                                .groupKey = "PRJ_RES(EU1)",
-                                .treePath = "R\\\\EU1\\\\EU-001 - Té EU"},
-                 CZodEVIArticle{.code = "GE-001",
-                                .unitPrice = 7,
-                                .quantityKey = "\"RSX_FRX_NB_Té\"",
-                                .groupKey = "PRJ_RES(RSX_GENERAL)",
-                                .treePath = "R\\\\GE-001 - Té général"}};
+    fake.file = {Filed("EU-001", 0, "\"RSX_FRX_NB_Té\"", "PRJ_RES(EU1)", "R\\\\EU1\\\\EU-001 - Té EU"),
+                 Filed("GE-001", 7, "\"RSX_FRX_NB_Té\"", "PRJ_RES(RSX_GENERAL)", "R\\\\GE-001 - Té général")};
     ASSERT_TRUE(Read(bdr));
     double price = 0;
     EXPECT_TRUE(GetPrice(bdr, 3, "Té", price, ""));
@@ -272,21 +270,10 @@ TEST_F(ScheduleExchange, EmptyNetworkMeansGeneralForGetPriceButEveryGroupForShow
 
 TEST_F(ScheduleExchange, PricesPerNetworkKeepEveryDigit)
 {
-    fake.file = {CZodEVIArticle{.code = "GE-001",
-                                .unitPrice = 12345.67,
-                                .quantityKey = "\"RSX_TUY_LIN_3D_PVC\"",
-                                .groupKey = "PRJ_RES(RSX_GENERAL)",
-                                .treePath = "R\\\\GE-001 - a"},
-                 CZodEVIArticle{.code = "EU-001",
-                                .unitPrice = 1500000,
-                                .quantityKey = "\"RSX_TUY_LIN_3D_PVC\"",
-                                .groupKey = "PRJ_RES(EU (tranche 2))",
-                                .treePath = "R\\\\EU-001 - b"},
-                 CZodEVIArticle{.code = "EP-001",
-                                .unitPrice = 0.1,
-                                .quantityKey = "\"RSX_TUY_LIN_3D_PVC\"",
-                                .groupKey = "PRJ_RES(EP1)",
-                                .treePath = "R\\\\EP-001 - c"}};
+    const std::string pvc = "\"RSX_TUY_LIN_3D_PVC\"";
+    fake.file = {Filed("GE-001", 12345.67, pvc, "PRJ_RES(RSX_GENERAL)", "R\\\\GE-001 - a"),
+                 Filed("EU-001", 1500000, pvc, "PRJ_RES(EU (tranche 2))", "R\\\\EU-001 - b"),
+                 Filed("EP-001", 0.1, pvc, "PRJ_RES(EP1)", "R\\\\EP-001 - c")};
     ASSERT_TRUE(Read(bdr));
     std::map<std::string, std::string> prices;
     ASSERT_TRUE(GetPricesPerNetwork(bdr, 0, "PVC", prices));

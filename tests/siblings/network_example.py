@@ -11,12 +11,13 @@ added and the schedule is written back byte for byte.
 usage: network_example.py VELHOST MODULES_DIR EXAMPLES_DIR WORK_DIR [--schedule]
 """
 import os
-import shutil
-import subprocess
 import sys
 import xml.etree.ElementTree as ET
 
 import ezdxf
+
+sys.path.insert(0, os.path.join(os.path.dirname(os.path.abspath(__file__)), "..", "support"))
+from velrun import fresh_folder, report, run_velhost  # noqa: E402
 
 SCRIPT = """OPEN projet_vrd.dxf
 APPLOAD Vel2000Srv
@@ -76,18 +77,13 @@ def schedule_keys(path):
 def main():
     velhost, modules, examples, work = (os.path.abspath(a) for a in sys.argv[1:5])
     with_schedule = sys.argv[5:] == ["--schedule"]
-    shutil.rmtree(work, ignore_errors=True)
-    os.makedirs(work)
-    shutil.copy(os.path.join(examples, "projet_vrd.dxf"), work)
-    shutil.copy(os.path.join(examples, "VelaBordereau.xml"), work)
+    fresh_folder(work, examples, ("projet_vrd.dxf", "VelaBordereau.xml"))
     with open(os.path.join(work, "reseaux.scr"), "w", encoding="utf-8") as f:
         f.write(SCHEDULE_SCRIPT if with_schedule else SCRIPT)
-    run = subprocess.run([velhost, "--script", "reseaux.scr", "--modules", modules, "--profile",
-                          os.path.join(work, "profil")], cwd=work, capture_output=True, text=True, timeout=120)
-    output = run.stdout + run.stderr
+    returncode, output = run_velhost(velhost, modules, work, "reseaux.scr", timeout=120)
     failures = []
-    if run.returncode != 0:
-        failures.append("exit status %d" % run.returncode)
+    if returncode != 0:
+        failures.append("exit status %d" % returncode)
     for text in EXPECTED_OUTPUT + (SCHEDULE_OUTPUT if with_schedule else []):
         if text not in output:
             failures.append("not in the output: %r" % text)
@@ -130,11 +126,7 @@ def main():
             for key in before[1]:
                 if key not in road_group:
                     failures.append("%s: no article of the example schedule counts %s" % (entry, key))
-    if failures:
-        print(output)
-        print("\n".join(failures))
-        return 1
-    return 0
+    return report(output, failures)
 
 
 if __name__ == "__main__":

@@ -20,38 +20,17 @@ struct Schedule {
     Schedule()
     {
         const std::string road = MakeRoadGroupKey();
-        AddFiled(bdr, {.nature = kNatureVolume,
-                       .designation = "Déblais",
-                       .unit = "m³",
-                       .quantityKey = "\"K1\"",
-                       .groupKey = road,
-                       .treePath = "Voirie\\\\Déblais\\\\Volumique\\\\GC-001 - Déblais"});
-        AddFiled(bdr, {.nature = kNatureNonGraphic,
-                       .designation = "Installation",
-                       .quantityKey = "\"\"",
-                       .groupKey = road,
-                       .treePath = "Voirie\\\\Travaux\\\\Non Graphique\\\\TP-001 - Installation"});
-        AddFiled(bdr, {.nature = kNatureLinear,
-                       .designation = "PVC",
-                       .unit = "m³",
-                       .quantityKey = "\"RSX_X\"",
-                       .groupKey = "PRJ_RES(EU)",
-                       .treePath = "EU\\\\Tuyaux\\\\Linéaire\\\\EU-001 - PVC"});
-        AddFiled(bdr, {.nature = kNatureNonGraphic,
-                       .designation = "Piquetage",
-                       .quantityKey = "\"\"",
-                       .groupKey = "PRJ_RES(EU)",
-                       .treePath = "EU\\\\Travaux\\\\Non Graphique\\\\TP-001 - Piquetage"});
-        AddFiled(bdr, {.nature = kNatureLinear,
-                       .designation = "Réseaux",
-                       .unit = "m³",
-                       .quantityKey = "\"RSX_G\"",
-                       .groupKey = "PRJ_RES(RSX_GENERAL)",
-                       .treePath = "Général\\\\Linéaire\\\\G-001 - Réseaux"});
-        AddFiled(bdr, {.nature = kNatureNonGraphic,
-                       .designation = "Forfait",
-                       .groupKey = "0",
-                       .treePath = "Divers\\\\Non Graphique\\\\F-001 - Forfait"});
+        AddFiled(bdr, road, "Voirie\\\\Déblais\\\\Volumique\\\\GC-001 - Déblais", kNatureVolume, "Déblais", "m³",
+                 "\"K1\"");
+        AddFiled(bdr, road, "Voirie\\\\Travaux\\\\Non Graphique\\\\TP-001 - Installation", kNatureNonGraphic,
+                 "Installation", "", "\"\"");
+        AddFiled(bdr, "PRJ_RES(EU)", "EU\\\\Tuyaux\\\\Linéaire\\\\EU-001 - PVC", kNatureLinear, "PVC", "m³",
+                 "\"RSX_X\"");
+        AddFiled(bdr, "PRJ_RES(EU)", "EU\\\\Travaux\\\\Non Graphique\\\\TP-001 - Piquetage", kNatureNonGraphic,
+                 "Piquetage", "", "\"\"");
+        AddFiled(bdr, "PRJ_RES(RSX_GENERAL)", "Général\\\\Linéaire\\\\G-001 - Réseaux", kNatureLinear, "Réseaux", "m³",
+                 "\"RSX_G\"");
+        AddFiled(bdr, "0", "Divers\\\\Non Graphique\\\\F-001 - Forfait", kNatureNonGraphic, "Forfait");
         bdr.NetworkGroups(networkGroups);
         bdr.RoadProjectArticles(roadArticles);
         bdr.NonGraphicArticles(lumpSums, true);

@@ -47,45 +47,15 @@ protected:
     void SetUp() override
     {
         const std::string road = MakeRoadGroupKey();
-        AddFiled(bdr, {.unitPrice = 9.5,
-                       .nature = 4,
-                       .designation = "Déblais",
-                       .unit = "m³",
-                       .quantityKey = "\"K1\"",
-                       .groupKey = road,
-                       .treePath = "Voirie\\\\Terrassements\\\\Volumique\\\\GC-001 - Déblais"});
-        AddFiled(bdr, {.unitPrice = 32,
-                       .nature = 2,
-                       .designation = "Bordure",
-                       .unit = "ml",
-                       .quantityKey = "\"BT2\"",
-                       .groupKey = road,
-                       .treePath = "Voirie\\\\Bordures\\\\Linéaire\\\\A-001 - Bordure"});
-        AddFiled(bdr, {.unitPrice = 150,
-                       .nature = 1,
-                       .designation = "Bordure",
-                       .unit = "u",
-                       .quantityKey = "\"BTN\"",
-                       .groupKey = road,
-                       .treePath = "Voirie\\\\Bordures\\\\Ponctuel\\\\A-002 - Bordure"});
-        AddFiled(bdr, {.unitPrice = 48,
-                       .nature = 2,
-                       .designation = "PVC 200",
-                       .unit = "ml",
-                       .quantityKey = "\"RSX_TUY\"",
-                       .groupKey = "PRJ_RES(EU)",
-                       .treePath = "EU\\\\Canalisation\\\\Linéaire\\\\EU-001 - PVC 200"});
-        AddFiled(bdr, {.unitPrice = 1200,
-                       .nature = 6,
-                       .designation = "Piquetage",
-                       .quantityKey = "\"\"",
-                       .groupKey = "PRJ_RES(EU)",
-                       .treePath = "EU\\\\Travaux\\\\Non Graphique\\\\TP-001 - Piquetage"});
-        AddFiled(bdr, {.unitPrice = 800,
-                       .nature = 6,
-                       .designation = "Assurance",
-                       .groupKey = "0",
-                       .treePath = "Divers\\\\Non Graphique\\\\F-001 - Assurance"});
+        AddFiled(bdr, road, "Voirie\\\\Terrassements\\\\Volumique\\\\GC-001 - Déblais", 4, "Déblais", "m³", "\"K1\"",
+                 9.5);
+        AddFiled(bdr, road, "Voirie\\\\Bordures\\\\Linéaire\\\\A-001 - Bordure", 2, "Bordure", "ml", "\"BT2\"", 32);
+        AddFiled(bdr, road, "Voirie\\\\Bordures\\\\Ponctuel\\\\A-002 - Bordure", 1, "Bordure", "u", "\"BTN\"", 150);
+        AddFiled(bdr, "PRJ_RES(EU)", "EU\\\\Canalisation\\\\Linéaire\\\\EU-001 - PVC 200", 2, "PVC 200", "ml",
+                 "\"RSX_TUY\"", 48);
+        AddFiled(bdr, "PRJ_RES(EU)", "EU\\\\Travaux\\\\Non Graphique\\\\TP-001 - Piquetage", 6, "Piquetage", "", "\"\"",
+                 1200);
+        AddFiled(bdr, "0", "Divers\\\\Non Graphique\\\\F-001 - Assurance", 6, "Assurance", "", "", 800);
 
         auto db = std::make_unique<AcDbDatabase>();
         FileRecord(*db, "VELANTO_ROUT2_DICT", "VELANTO_ROUT2_PROJ", "R1", {{"\"K1\"", 3}, {"\"BT2\"", 10}});

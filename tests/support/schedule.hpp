@@ -16,8 +16,8 @@ inline CZodEVIArticle* AddFiled(zodevi::CZodEVIBdr& bdr, CZodEVIArticle fields)
 }
 
 // One article in one line: the fields the dialogs, filters and estimates look at.
-inline CZodEVIArticle* AddFiled(CZodEVIBdr& bdr, const std::string& groupKey, const std::string& treePath, int nature,
-                                const std::string& designation, const std::string& unit = "",
+inline CZodEVIArticle* AddFiled(zodevi::CZodEVIBdr& bdr, const std::string& groupKey, const std::string& treePath,
+                                int nature, const std::string& designation, const std::string& unit = "",
                                 const std::string& quantityKey = "", double unitPrice = 0)
 {
     return AddFiled(bdr, {.unitPrice = unitPrice,

@@ -4,6 +4,8 @@
 
 #include <sys/types.h>
 
+#include "velhost/read_result.h"
+
 #include <cstddef>
 #include <cstdint>
 #include <memory>
@@ -14,13 +16,6 @@
 
 // Outcome of a write: on failure, a French sentence naming the file, what went wrong and
 // what to do, and the system's error code. A success may carry a warning.
-struct VelFileResult {
-    bool ok = true;
-    int error = 0;
-    std::string message;
-    explicit operator bool() const { return ok; }
-};
-
 struct VelWriteOptions {
     // The version being replaced is kept as "<path>.bak" (replacing an older one in one
     // step); nothing is kept when the file did not exist.
@@ -32,7 +27,7 @@ struct VelWriteOptions {
 // allows), and is renamed over the target; the folder is then flushed too. A symbolic
 // link is followed, so the file it names is replaced; a file protected from writing is
 // not replaced. On failure the temporary file is removed and the target is as it was.
-VelFileResult velWriteFileAtomically(const std::string& path, std::string_view content,
+VelReadResult velWriteFileAtomically(const std::string& path, std::string_view content,
                                      const VelWriteOptions& options = {});
 
 // The same in steps, for content produced piece by piece or by a library that writes to
@@ -45,18 +40,18 @@ public:
     VelAtomicFile(const VelAtomicFile&) = delete;
     VelAtomicFile& operator=(const VelAtomicFile&) = delete;
 
-    VelFileResult open();
+    VelReadResult open();
     // The temporary file; whatever writes it must leave it in place (no rename).
     const std::string& temporaryPath() const { return temporary_; }
-    VelFileResult write(std::string_view piece);
-    VelFileResult commit();
+    VelReadResult write(std::string_view piece);
+    VelReadResult commit();
     // Removes the temporary file; the target is left alone.
     void discard();
     // The file that a commit replaces (the target of a symbolic link).
     const std::string& target() const { return target_; }
 
 private:
-    VelFileResult fail(const char* step, int error);
+    VelReadResult fail(const char* step, int error);
 
     std::string path_;
     std::string target_;
@@ -131,13 +126,13 @@ public:
     VelFileLock(const VelFileLock&) = delete;
     VelFileLock& operator=(const VelFileLock&) = delete;
     bool locked() const { return key_ != nullptr; }
-    const VelFileResult& result() const { return result_; }
+    const VelReadResult& result() const { return result_; }
     // The lock file of a file.
     static std::string lockFileOf(const std::string& path);
 
 private:
     void* key_ = nullptr;
-    VelFileResult result_;
+    VelReadResult result_;
 };
 
 // French reason for a system error code ("disque plein", "permission refusée"...) and

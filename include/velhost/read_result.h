@@ -1,5 +1,5 @@
-// What a reader of a file answers: read, or why not and where, with the French message
-// the user sees. Standard library only, so that any module can answer it too.
+// What a reader (or a writer) of a file answers: done, or why not and where, with the French
+// message the user sees. Standard library only, so that any module can answer it too.
 #pragma once
 
 #include <cstdint>

@@ -979,8 +979,8 @@ VelReadResult WriteEstimateWorkbook(const std::string& path, const Estimate& est
 {
     // The library writes to a name: it is given the writer's temporary file.
     VelAtomicFile file(path);
-    if (VelFileResult opened = file.open(); !opened)
-        return VelReadResult::Failed(VelReadStatus::kCannotWrite, path, opened.error, opened.message);
+    if (VelReadResult opened = file.open(); !opened)
+        return opened;
     if (VelReadResult written = WriteWorkbookFile(file.temporaryPath(), estimate, currency); !written) {
         // The message names the file the user asked for, not the temporary one.
         const std::string& temporary = file.temporaryPath();
@@ -989,9 +989,9 @@ VelReadResult WriteEstimateWorkbook(const std::string& path, const Estimate& est
         written.file = path;
         return written;
     }
-    VelFileResult committed = file.commit();
+    VelReadResult committed = file.commit();
     if (!committed)
-        return VelReadResult::Failed(VelReadStatus::kCannotWrite, path, committed.error, committed.message);
+        return committed;
     if (!committed.message.empty())
         acutPrintf("%s\n", committed.message.c_str());
     return {};

@@ -862,9 +862,9 @@ VelReadResult WriteFileAtomically(const std::string& path, std::string_view cont
 {
     VelWriteOptions options;
     options.keepBackup = keepBackup;
-    VelFileResult written = velWriteFileAtomically(path, content, options);
+    VelReadResult written = velWriteFileAtomically(path, content, options);
     if (!written)
-        return VelReadResult::Failed(VelReadStatus::kCannotWrite, path, written.error, std::move(written.message));
+        return written;
     if (!written.message.empty())
         acutPrintf("%s\n", written.message.c_str());
     return {};

@@ -55,12 +55,12 @@ bool velWriteDrawing(AcDbDatabase& database, std::string& out, std::string& erro
 bool velSaveDrawing(AcDbDatabase& database, const std::string& path, std::string& error)
 {
     VelAtomicFile file(path);
-    VelFileResult result = file.open();
+    VelReadResult result = file.open();
     std::string writeError;
     if (result && !database.file().Write(
                       [&](std::string_view piece) {
                           result = file.write(piece);
-                          return result.ok;
+                          return static_cast<bool>(result);
                       },
                       writeError)) {
         error = result ? FormatString("« %s » : %s", path.c_str(), writeError.c_str()) : result.message;

@@ -356,24 +356,25 @@ VelAtomicFile::~VelAtomicFile()
     discard();
 }
 
-VelFileResult VelAtomicFile::fail(const char* step, int error)
+VelReadResult VelAtomicFile::fail(const char* step, int error)
 {
     discard();
-    return {false, error, Failure(path_, step, error, existed_)};
+    return VelReadResult::Failed(VelReadStatus::kCannotWrite, path_, error, Failure(path_, step, error, existed_));
 }
 
-VelFileResult VelAtomicFile::open()
+VelReadResult VelAtomicFile::open()
 {
     discard();
     struct stat st {};
     existed_ = ::stat(target_.c_str(), &st) == 0;
     if (existed_ && S_ISDIR(st.st_mode))
-        return {false, EISDIR, Failure(path_, "", EISDIR, false)};
+        return VelReadResult::Failed(VelReadStatus::kCannotWrite, path_, EISDIR, Failure(path_, "", EISDIR, false));
     // A rename would replace a file its owner protected from writing: it is refused as a
     // write into it would be.
     if (existed_ && ::access(target_.c_str(), W_OK) != 0) {
         const int error = errno;
-        return {false, error, Failure(path_, "le fichier est protégé en écriture", error, true)};
+        return VelReadResult::Failed(VelReadStatus::kCannotWrite, path_, error,
+                                     Failure(path_, "le fichier est protégé en écriture", error, true));
     }
     for (int attempt = 0;; ++attempt) {
         temporary_ = SiblingName(target_, ".tmp-");
@@ -387,20 +388,22 @@ VelFileResult VelAtomicFile::open()
     }
 }
 
-VelFileResult VelAtomicFile::write(std::string_view piece)
+VelReadResult VelAtomicFile::write(std::string_view piece)
 {
     if (fd_ < 0)
-        return {false, EBADF, Failure(path_, "fichier temporaire absent", EBADF, existed_)};
+        return VelReadResult::Failed(VelReadStatus::kCannotWrite, path_, EBADF,
+                                     Failure(path_, "fichier temporaire absent", EBADF, existed_));
     int error = 0;
     if (!WriteAll(fd_, piece, error))
         return fail("pendant l'écriture", error);
     return {};
 }
 
-VelFileResult VelAtomicFile::commit()
+VelReadResult VelAtomicFile::commit()
 {
     if (fd_ < 0)
-        return {false, EBADF, Failure(path_, "fichier temporaire absent", EBADF, existed_)};
+        return VelReadResult::Failed(VelReadStatus::kCannotWrite, path_, EBADF,
+                                     Failure(path_, "fichier temporaire absent", EBADF, existed_));
     // A library given the temporary file's name may have replaced it: flush what is there.
     struct stat ours {
     }, named{};
@@ -440,7 +443,7 @@ VelFileResult VelAtomicFile::commit()
     }
     temporary_.clear();
     // The rename is done: the new version is in place whatever follows.
-    VelFileResult result;
+    VelReadResult result;
     if (!staging.empty() && Calls().rename(staging.c_str(), (target_ + ".bak").c_str()) != 0) {
         result.error = errno;
         ::unlink(staging.c_str());
@@ -475,12 +478,12 @@ void VelAtomicFile::discard()
     temporary_.clear();
 }
 
-VelFileResult velWriteFileAtomically(const std::string& path, std::string_view content, const VelWriteOptions& options)
+VelReadResult velWriteFileAtomically(const std::string& path, std::string_view content, const VelWriteOptions& options)
 {
     VelAtomicFile file(path, options);
-    if (VelFileResult opened = file.open(); !opened)
+    if (VelReadResult opened = file.open(); !opened)
         return opened;
-    if (VelFileResult written = file.write(content); !written)
+    if (VelReadResult written = file.write(content); !written)
         return written;
     return file.commit();
 }
@@ -649,7 +652,8 @@ VelFileLock::VelFileLock(const std::string& path, int waitSeconds)
     const auto failure = [&](int error) {
         const std::string step =
             error == EAGAIN ? FormatString("depuis %d s", waitSeconds) : "pendant la pose du verrou";
-        result_ = {false, error, Failure(path, step, error, ::access(path.c_str(), F_OK) == 0)};
+        result_ = VelReadResult::Failed(VelReadStatus::kCannotWrite, path, error,
+                                        Failure(path, step, error, ::access(path.c_str(), F_OK) == 0));
     };
     if (fs::path(ResolveLinks(path)).filename().empty()) {
         failure(path.empty() ? ENOENT : EISDIR);

@@ -113,10 +113,10 @@ bool HasBreak(const char* s)
 
 bool velReplaceFile(const std::string& fileName, const std::string& content)
 {
-    const VelFileResult written = velWriteFileAtomically(fileName, content);
+    const VelReadResult written = velWriteFileAtomically(fileName, content);
     if (!written)
         errno = written.error;
-    return written.ok;
+    return static_cast<bool>(written);
 }
 
 std::string velIniValue(const std::string& content, std::string_view section, std::string_view key,

@@ -60,7 +60,7 @@ TEST(VelFileWriter, ReplacedFileKeepsModeLinkAndBackup)
         }
         VelWriteOptions options;
         options.keepBackup = c.backup;
-        const VelFileResult result = velWriteFileAtomically(path, "v2", options);
+        const VelReadResult result = velWriteFileAtomically(path, "v2", options);
         ASSERT_TRUE(result) << result.message;
         EXPECT_EQ(result.message, "");
         EXPECT_EQ(dir.Read(std::string(c.name) + ".txt"), "v2");
@@ -99,13 +99,13 @@ TEST(VelFileWriter, FailuresSayWhyAndLeaveNothing)
     chmod(locked.c_str(), 0444);
     for (const Case& c : cases) {
         SCOPED_TRACE(c.name);
-        const VelFileResult result = velWriteFileAtomically(c.path, "x");
+        const VelReadResult result = velWriteFileAtomically(c.path, "x");
         EXPECT_FALSE(result);
         EXPECT_EQ(result.message.rfind("Fichier « " + c.path + " »", 0), 0u) << result.message;
         EXPECT_NE(result.message.find(c.expected), std::string::npos) << result.message;
     }
     if (geteuid() != 0) {
-        const VelFileResult result = velWriteFileAtomically(locked, "a=2");
+        const VelReadResult result = velWriteFileAtomically(locked, "a=2");
         EXPECT_NE(result.message.find("permission refusée (le fichier est protégé en écriture)"), std::string::npos)
             << result.message;
         EXPECT_EQ(dir.Read("protege.ini"), "a=1");
@@ -120,7 +120,7 @@ TEST(VelFileWriter, EveryFailingCallLeavesThePreviousVersion)
     const std::string path = dir.File("prix.xml");
     VelWriteOptions options;
     options.keepBackup = true;
-    VelFileResult result;
+    VelReadResult result;
     const int calls = ForEveryFailingCall(
         [&] {
             fs::remove_all(dir.path);

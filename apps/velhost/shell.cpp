@@ -18,29 +18,20 @@ namespace fs = std::filesystem;
 
 namespace {
 
-std::string Trimmed(const std::string& text)
-{
-    const auto first = text.find_first_not_of(" \t");
-    if (first == std::string::npos)
-        return {};
-    const auto last = text.find_last_not_of(" \t");
-    return text.substr(first, last - first + 1);
-}
-
 // First word and the rest of a line.
 std::pair<std::string, std::string> SplitFirst(const std::string& line)
 {
-    const std::string t = Trimmed(line);
+    const std::string t = TrimBlanks(line);
     const auto space = t.find_first_of(" \t");
     if (space == std::string::npos)
         return {t, {}};
-    return {t.substr(0, space), Trimmed(t.substr(space))};
+    return {t.substr(0, space), TrimBlanks(t.substr(space))};
 }
 
 std::vector<std::string> Words(const std::string& text)
 {
     std::vector<std::string> words;
-    std::string rest = Trimmed(text);
+    std::string rest = TrimBlanks(text);
     while (!rest.empty()) {
         auto [first, tail] = SplitFirst(rest);
         words.push_back(first);

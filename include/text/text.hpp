@@ -49,6 +49,9 @@ std::string FormatRealShortest(double value);
 
 // Locale-independent parsing of a whole text (surrounding blanks allowed); nullopt when
 // the text is not a number.
+// The text without the blanks (spaces and tabs) at either end.
+std::string TrimBlanks(std::string_view text);
+
 std::optional<double> ParseReal(std::string_view text);
 std::optional<long long> ParseInt(std::string_view text);
 

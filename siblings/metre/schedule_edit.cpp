@@ -60,15 +60,6 @@ std::string RebuiltTreePath(const CZodEVIArticle& article, int previousNature)
     return category.empty() ? leaf : category + std::string(kSeparator) + leaf;
 }
 
-std::string Trim(std::string_view text)
-{
-    const std::size_t start = text.find_first_not_of(" \t");
-    if (start == std::string_view::npos)
-        return {};
-    const std::size_t end = text.find_last_not_of(" \t");
-    return std::string(text.substr(start, end - start + 1));
-}
-
 } // namespace
 
 const CZodEVIArticleField* FieldNamed(std::string_view name)
@@ -158,7 +149,7 @@ void ScheduleEdit::FillFromTreePath(CZodEVIArticle& article, bool code, bool des
 
 bool ScheduleEdit::Add(const std::string& treePath, std::string& error)
 {
-    if (Trim(treePath).empty()) {
+    if (TrimBlanks(treePath).empty()) {
         error = "chemin d'arborescence vide";
         return false;
     }
@@ -180,7 +171,7 @@ bool ScheduleEdit::Validate(std::string& error) const
 {
     for (std::size_t i = 0; i < entries_.size(); ++i) {
         const std::string& path = entries_[i].article.treePath;
-        if (Trim(path).empty()) {
+        if (TrimBlanks(path).empty()) {
             error = FormatString("l'article « %s » n'a pas de chemin d'arborescence (treePath)",
                                  entries_[i].article.code.c_str());
             return false;
@@ -335,7 +326,7 @@ bool ParseScheduleTable(std::string_view text, const std::string& name, Schedule
         ++lineNumber;
         if (!line.empty() && line.back() == '\r')
             line.remove_suffix(1);
-        const std::string trimmed = Trim(line);
+        const std::string trimmed = TrimBlanks(line);
         if (trimmed.empty() || trimmed[0] == '#')
             continue;
         if (trimmed[0] == '[') {
@@ -366,7 +357,7 @@ bool ParseScheduleTable(std::string_view text, const std::string& name, Schedule
         const std::size_t equals = line.find('=');
         if (equals == std::string_view::npos)
             return fail(lineNumber, FormatString("« nom = valeur » attendu, « %s » trouvé", trimmed.c_str()));
-        const std::string fieldName = Trim(line.substr(0, equals));
+        const std::string fieldName = TrimBlanks(line.substr(0, equals));
         const CZodEVIArticleField* field = FieldNamed(fieldName);
         if (field == nullptr)
             return fail(lineNumber, FormatString("champ inconnu « %s »", fieldName.c_str()));

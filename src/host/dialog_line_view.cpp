@@ -11,15 +11,6 @@ namespace {
 
 constexpr const char* kShowVerb = "afficher";
 
-std::string Trimmed(const std::string& text)
-{
-    const auto first = text.find_first_not_of(" \t");
-    if (first == std::string::npos)
-        return {};
-    const auto last = text.find_last_not_of(" \t");
-    return text.substr(first, last - first + 1);
-}
-
 const char* StateText(int image)
 {
     switch (image) {
@@ -98,7 +89,7 @@ LineAct Parse(const CVelDialog& dialog, const std::string& text)
             const std::size_t n = control.scriptName.size();
             if (text.size() > n && (text[n] == ' ' || text[n] == '\t') &&
                 EqualsNoCase(text.substr(0, n), control.scriptName))
-                return {&control, Trimmed(text.substr(n))};
+                return {&control, TrimBlanks(text.substr(n))};
         } else if (EqualsNoCase(text, control.scriptName)) {
             return {&control, {}};
         }
@@ -140,7 +131,7 @@ int velRunDialogLines(CVelDialog& dialog, VelUserInterface& ui)
             dialog.Close();
             break;
         }
-        const std::string text = Trimmed(line->text);
+        const std::string text = TrimBlanks(line->text);
         if (text.empty())
             continue;
         if (EqualsNoCase(text, kShowVerb)) {

@@ -275,6 +275,15 @@ std::string FormatRealShortest(double value)
     return std::string(buffer, result.ptr);
 }
 
+std::string TrimBlanks(std::string_view text)
+{
+    const std::size_t first = text.find_first_not_of(" \t");
+    if (first == std::string_view::npos)
+        return {};
+    const std::size_t last = text.find_last_not_of(" \t");
+    return std::string(text.substr(first, last - first + 1));
+}
+
 std::optional<double> ParseReal(std::string_view text)
 {
     text = Trim(text);
